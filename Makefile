@@ -1,0 +1,61 @@
+# Kestrelgauge: set-up, build, demo and tests on a Debian 12 machine.
+# `make demo` and `make test` install what is missing (as root), then build and run.
+
+BUILD      ?= build
+ASAN_BUILD ?= build-asan
+JOBS       ?= 2
+
+# Everything the build, the tests and the demo need, beyond make and git.
+PKGS := g++ cmake pkg-config ca-certificates \
+        libgtest-dev libgmock-dev libbenchmark-dev \
+        libx11-dev libxext-dev libxt-dev libmotif-dev libxft-dev libxmu-dev libfontconfig-dev \
+        zlib1g-dev nlohmann-json3-dev \
+        clang libclang-rt-14-dev \
+        xvfb xdotool x11-apps x11-utils imagemagick xfonts-base fonts-dejavu-core \
+        lcov time
+
+.PHONY: all deps configure build demo test test-release test-asan bench clean
+
+all: build
+
+deps:
+	@missing=$$(for p in $(PKGS); do \
+	    dpkg-query -W -f='$${Status}\n' $$p 2>/dev/null | grep -q '^install ok installed' || echo $$p; \
+	  done); \
+	if [ -n "$$missing" ]; then \
+	  if [ "$$(id -u)" = 0 ]; then \
+	    echo "Installing: $$missing"; \
+	    apt-get update && DEBIAN_FRONTEND=noninteractive apt-get install -y --no-install-recommends $$missing || exit 1; \
+	  else \
+	    echo "These Debian packages are missing. Install them with:"; \
+	    echo "  sudo apt-get install -y $$missing"; \
+	    exit 1; \
+	  fi; \
+	fi
+
+$(BUILD)/CMakeCache.txt: | deps
+	cmake -S . -B $(BUILD) -DCMAKE_BUILD_TYPE=RelWithDebInfo
+
+configure: deps $(BUILD)/CMakeCache.txt
+
+build: configure
+	cmake --build $(BUILD) -j$(JOBS)
+
+demo: build
+	@bash tools/run-demo.sh $(BUILD)
+
+test-release: build
+	cd $(BUILD) && ctest --output-on-failure -j$(JOBS)
+
+test-asan: deps
+	cmake -S . -B $(ASAN_BUILD) -DCMAKE_BUILD_TYPE=Debug -DKG_SANITIZE=ON
+	cmake --build $(ASAN_BUILD) -j$(JOBS)
+	cd $(ASAN_BUILD) && ctest --output-on-failure -j$(JOBS)
+
+test: test-release test-asan
+
+bench: build
+	@for b in bench/*.sh; do [ -f "$$b" ] && bash "$$b" $(BUILD) || exit 1; done
+
+clean:
+	rm -rf $(BUILD) $(ASAN_BUILD)

@@ -1,0 +1,162 @@
+// Start-up: identity, installation directory, language, options, file list, then the mode.
+#include "startup/startup.h"
+
+#include <sys/utsname.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+
+#include "startup/diagnostic.h"
+#include "startup/runtime_options.h"
+
+StartupState& startupState() {
+  static StartupState s;
+  return s;
+}
+
+const char* const kUsageText =
+    "Example:\n        kestrel -view a.out.kgv\n \nUse this interactive program to view coverage "
+    "data collected by\nKestrelgauge.\n \nSyntax:\n        kestrel -view [-force-merge] FILE "
+    "[FILE...]\n \nEach FILE should be a Kestrelgauge binary file.  The data for the\nset of files "
+    "will be combined together prior to presentation in the\nGUI.  If some of the coverage data "
+    "are from different versions of the\nprogram(s), then the most recent data will be used and "
+    "older data\nwill be ignored.  To change this behavior, use the -force-merge flag which\nwill "
+    "cause the files to be combined regardless of their versions.\n \n";
+
+std::string versionBanner(const StartupState& s) {
+  struct utsname u {};
+  std::string platform = "Linux";
+  if (uname(&u) == 0) platform = std::string(u.sysname) + " " + u.machine;
+  char line[512];
+  snprintf(line, sizeof line, "Kestrelgauge viewer %s (built %s) for %s\n", KG_VERSION, __DATE__,
+           platform.c_str());
+  std::string out = line;
+  out += "   Installed in:         " + s.installDir + "\n";
+  out += "   Scripts installed in: " + s.scriptsDir + "\n";
+  return out;
+}
+
+namespace {
+
+// The mode is the first argument after the program name; the product's command puts it there.
+bool takeMode(int& argc, char** argv, StartupState& s) {
+  if (argc < 2 || !argv[1]) return true;
+  const char* m = argv[1];
+  if (strcmp(m, "-view") == 0) {
+    s.mode = RunMode::view;
+  } else if (strcmp(m, "-export") == 0) {
+    s.mode = RunMode::exportReport;
+  } else if (strcmp(m, "-extract") == 0) {
+    s.mode = RunMode::extract;
+  } else if (strncmp(m, "-merge=", 7) == 0) {
+    s.mode = RunMode::merge;
+    s.mergeTarget = m + 7;
+    if (s.mergeTarget.empty()) return false;
+  } else if (strcmp(m, "-merge") == 0) {
+    return false;
+  } else {
+    return true;  // no mode word: the viewer
+  }
+  for (int i = 1; i + 1 < argc; ++i) argv[i] = argv[i + 1];
+  argv[--argc] = nullptr;
+  return true;
+}
+
+const char* modeProgramName(RunMode mode) {
+  switch (mode) {
+    case RunMode::exportReport: return "kestrel -export";
+    case RunMode::merge: return "kestrel -merge";
+    case RunMode::extract: return "kestrel -extract";
+    case RunMode::view: break;
+  }
+  return "kestrel -view";
+}
+
+// Step 5: "-language VALUE" or "-language=VALUE".
+const char* languageArgument(int argc, char** argv) {
+  for (int i = 1; i < argc; ++i) {
+    const char* a = argv[i];
+    if (!a || strncmp(a, "-language", 9) != 0) continue;
+    if (a[9] == '\0' && i + 1 < argc) return argv[i + 1];
+    if (a[9] == '=') return a + 10;
+  }
+  return nullptr;
+}
+
+}  // namespace
+
+ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
+  StartupState& s = startupState();
+
+  // 1. Identity for all messages.
+  diag::setIdentity("Kestrelgauge viewer", "Kestrelgauge", "kestrel");
+
+  // 2. Enclosing double quotes come off every argument.
+  stripArgumentQuotes(argc, argv);
+
+  if (!takeMode(argc, argv, s)) usageError();
+  s.programName = modeProgramName(s.mode);
+
+  // 3. The installation directory is required.
+  std::string home;
+  if (!findRawOptionValue(argc, argv, "kestrelhome", home) || home.empty()) usageError();
+
+  // 4. Runtime options the runtime library reads.
+  setOption(KESTREL, 1);
+  setStringOption(KESTREL_HOME, home.c_str());
+
+  // 5. Language.
+  s.language = kgChooseLanguage(languageArgument(argc, argv));
+
+  // 6. The display, for the window only.
+  if (s.mode == RunMode::view && displayCheck) {
+    ErrorCode rc = displayCheck(argc, argv);
+    if (rc != allOK) return rc;
+  }
+
+  // 9. Load step 1: options.
+  s.options = makeViewerOptionTable();
+  parseViewerOptions(s.programName.c_str(), s.options, argc, argv);
+
+  // Load step 2: kestrelhome again, now from the parsed table.
+  const ViewerOption* kh = findGivenOption("kestrelhome", s.options);
+  if (!kh || kh->value.empty()) usageError();
+  s.installDir = kh->value;
+  s.scriptsDir = s.installDir + "/scripts";
+
+  // Load step 3: help and version.
+  bool help = findGivenOption("help", s.options) != nullptr;
+  bool version = findGivenOption("version", s.options) != nullptr;
+  if (help) {
+    fflush(stdout);
+    fputs(kUsageText, stderr);
+  }
+  if (version) {
+    fflush(stdout);
+    fputs(versionBanner(s).c_str(), stderr);
+  }
+  if (help || version) {
+    fflush(stderr);
+    return allOK;
+  }
+
+  // Load step 4: locking.
+  s.lockingEnabled = getBoolViewerOption("locking", s.options, true, true);
+
+  // Load step 5: files. argv[0] is the program name; the rest are FILE arguments.
+  for (int i = 1; i < argc; ++i) s.fileArgs.emplace_back(argv[i]);
+  if (s.fileArgs.empty()) {
+    reportError(noFileName,
+                "No files were specified on the command line.\n"
+                "Please specify a list of one or more .kgv files.\n");
+    return noFileName;
+  }
+
+  // Load step 7: merge mode.
+  s.mergeMode = getBoolViewerOption("forcemerge", s.options, false, true) ? 2 : 1;
+
+  // The loading of data comes with the data engine.
+  reportError(notImplemented, "%s", errorMessage(notImplemented).c_str());
+  return notImplemented;
+}

@@ -1,0 +1,141 @@
+// Scratch directories, file helpers and a process runner for the tests.
+#include "tests/support/test_support.h"
+
+#include <fcntl.h>
+#include <poll.h>
+#include <signal.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+#include <stdexcept>
+
+namespace kgtest {
+
+TempDir::TempDir() {
+  const char* t = getenv("TMPDIR");
+  std::string base = (t && *t) ? t : "/tmp";
+  std::string templ = base + "/kgtest.XXXXXX";
+  std::vector<char> buf(templ.begin(), templ.end());
+  buf.push_back('\0');
+  if (!mkdtemp(buf.data())) throw std::runtime_error("mkdtemp failed");
+  path_ = buf.data();
+}
+
+TempDir::~TempDir() {
+  std::error_code ec;
+  // Lock directories are made read-only; give write permission back so removal works.
+  for (auto it = std::filesystem::recursive_directory_iterator(path_, ec);
+       !ec && it != std::filesystem::recursive_directory_iterator(); it.increment(ec)) {
+    if (it->is_directory(ec)) chmod(it->path().c_str(), 0755);
+  }
+  chmod(path_.c_str(), 0755);
+  std::filesystem::remove_all(path_, ec);
+}
+
+void writeFile(const std::string& path, const std::string& content) {
+  std::ofstream f(path, std::ios::binary | std::ios::trunc);
+  if (!f) throw std::runtime_error("cannot write " + path);
+  f << content;
+}
+
+std::string readFile(const std::string& path) {
+  std::ifstream f(path, std::ios::binary);
+  if (!f) throw std::runtime_error("cannot read " + path);
+  std::ostringstream s;
+  s << f.rdbuf();
+  return s.str();
+}
+
+bool fileExists(const std::string& path) {
+  struct stat st;
+  return lstat(path.c_str(), &st) == 0;
+}
+
+ProcessResult runProcess(const std::vector<std::string>& argv, const std::vector<std::string>& env,
+                         const std::string& input, const std::string& cwd) {
+  int inPipe[2], outPipe[2], errPipe[2];
+  if (pipe(inPipe) || pipe(outPipe) || pipe(errPipe)) throw std::runtime_error("pipe failed");
+  pid_t pid = fork();
+  if (pid < 0) throw std::runtime_error("fork failed");
+  if (pid == 0) {
+    dup2(inPipe[0], 0);
+    dup2(outPipe[1], 1);
+    dup2(errPipe[1], 2);
+    for (int fd : {inPipe[0], inPipe[1], outPipe[0], outPipe[1], errPipe[0], errPipe[1]}) close(fd);
+    for (const auto& e : env) {
+      size_t eq = e.find('=');
+      if (eq == std::string::npos) unsetenv(e.c_str());
+      else setenv(e.substr(0, eq).c_str(), e.substr(eq + 1).c_str(), 1);
+    }
+    if (!cwd.empty() && chdir(cwd.c_str()) != 0) _exit(126);
+    std::vector<char*> args;
+    for (const auto& a : argv) args.push_back(const_cast<char*>(a.c_str()));
+    args.push_back(nullptr);
+    signal(SIGPIPE, SIG_DFL);
+    execv(args[0], args.data());
+    _exit(127);
+  }
+  close(inPipe[0]);
+  close(outPipe[1]);
+  close(errPipe[1]);
+  ProcessResult r;
+  size_t written = 0;
+  int inFd = inPipe[1];
+  if (input.empty()) {
+    close(inFd);
+    inFd = -1;
+  }
+  bool outOpen = true, errOpen = true;
+  while (outOpen || errOpen) {
+    struct pollfd fds[3];
+    int n = 0;
+    int outIdx = -1, errIdx = -1, inIdx = -1;
+    if (outOpen) { fds[n] = {outPipe[0], POLLIN, 0}; outIdx = n++; }
+    if (errOpen) { fds[n] = {errPipe[0], POLLIN, 0}; errIdx = n++; }
+    if (inFd >= 0) { fds[n] = {inFd, POLLOUT, 0}; inIdx = n++; }
+    if (poll(fds, n, -1) < 0) break;
+    char buf[65536];
+    if (outIdx >= 0 && fds[outIdx].revents) {
+      ssize_t k = read(outPipe[0], buf, sizeof buf);
+      if (k > 0) r.out.append(buf, k); else outOpen = false;
+    }
+    if (errIdx >= 0 && fds[errIdx].revents) {
+      ssize_t k = read(errPipe[0], buf, sizeof buf);
+      if (k > 0) r.err.append(buf, k); else errOpen = false;
+    }
+    if (inIdx >= 0 && fds[inIdx].revents) {
+      void (*old)(int) = signal(SIGPIPE, SIG_IGN);
+      ssize_t k = write(inFd, input.data() + written, input.size() - written);
+      signal(SIGPIPE, old);
+      if (k > 0) written += static_cast<size_t>(k);
+      if (k <= 0 || written == input.size()) { close(inFd); inFd = -1; }
+    }
+  }
+  if (inFd >= 0) close(inFd);
+  close(outPipe[0]);
+  close(errPipe[0]);
+  int status = 0;
+  waitpid(pid, &status, 0);
+  r.status = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
+  return r;
+}
+
+std::string buildDir() {
+  const char* b = getenv("KG_BUILD_DIR");
+  return b ? b : KG_BUILD_DIR;
+}
+
+std::string sourceDir() {
+  const char* s = getenv("KG_SOURCE_DIR");
+  return s ? s : KG_SOURCE_DIR;
+}
+
+std::string binPath(const std::string& program) { return buildDir() + "/bin/" + program; }
+
+}  // namespace kgtest

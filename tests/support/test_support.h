@@ -1,0 +1,44 @@
+// Helpers shared by the tests: scratch directories, files, and running real processes.
+#pragma once
+
+#include <string>
+#include <vector>
+
+namespace kgtest {
+
+// A fresh directory under the temporary directory, removed with everything in it.
+class TempDir {
+ public:
+  TempDir();
+  ~TempDir();
+  TempDir(const TempDir&) = delete;
+  TempDir& operator=(const TempDir&) = delete;
+  const std::string& path() const { return path_; }
+  std::string file(const std::string& name) const { return path_ + "/" + name; }
+
+ private:
+  std::string path_;
+};
+
+void writeFile(const std::string& path, const std::string& content);
+std::string readFile(const std::string& path);
+bool fileExists(const std::string& path);
+
+struct ProcessResult {
+  int status = -1;      // exit status, or 128 + signal when killed
+  std::string out;      // standard output
+  std::string err;      // standard error
+};
+
+// Runs argv[0] (a path) with the given arguments and environment changes ("NAME=value"
+// sets, "NAME" alone unsets), optional standard input text and working directory.
+ProcessResult runProcess(const std::vector<std::string>& argv,
+                         const std::vector<std::string>& env = {}, const std::string& input = {},
+                         const std::string& cwd = {});
+
+// Paths in the build tree.
+std::string buildDir();
+std::string sourceDir();
+std::string binPath(const std::string& program);  // build/bin/<program>
+
+}  // namespace kgtest
