@@ -1,0 +1,1 @@
+// Locks (filled in below).

@@ -1,0 +1,1 @@
+// Merging (filled in below).
