@@ -1,6 +1,5 @@
 // Reading and writing data files: both byte orders, the header checks, damaged and
 // hostile files, exact round trips, and a write that fails half-way.
-#include <dirent.h>
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <sys/resource.h>
@@ -34,15 +33,8 @@ pad 3
 
 std::string withOrder(const std::string& order) { return "order " + order + "\n" + kProgram; }
 
-std::vector<std::string> filesIn(const std::string& dir) {
-  std::vector<std::string> names;
-  if (DIR* d = opendir(dir.c_str())) {
-    while (dirent* e = readdir(d))
-      if (std::strcmp(e->d_name, ".") && std::strcmp(e->d_name, "..")) names.push_back(e->d_name);
-    closedir(d);
-  }
-  return names;
-}
+}  // namespace
+namespace kgtest {
 
 }  // namespace
 

@@ -1,7 +1,11 @@
 // Shared by the coverage tests: data files made from descriptions, and reading them back.
 #pragma once
 
+#include <dirent.h>
 #include <gtest/gtest.h>
+
+#include <cstring>
+#include <vector>
 
 #include <memory>
 #include <string>
@@ -44,6 +48,17 @@ inline std::string describeMap(const ObjRecord& r) {
     s += (tag < 8 ? names[tag] : "?") + std::string(":") + v + ":" + std::to_string(r.counts[i]) + " ";
   }
   return s;
+}
+
+// The names in a directory, without "." and "..".
+inline std::vector<std::string> filesIn(const std::string& dir) {
+  std::vector<std::string> names;
+  if (DIR* d = opendir(dir.c_str())) {
+    while (dirent* e = readdir(d))
+      if (std::strcmp(e->d_name, ".") && std::strcmp(e->d_name, "..")) names.push_back(e->d_name);
+    closedir(d);
+  }
+  return names;
 }
 
 }  // namespace kgtest
