@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <cstdio>
 #include <ctime>
+#include <vector>
 
 namespace {
 
@@ -19,6 +20,14 @@ struct LockSettings {
   std::function<void()> sleeper;
   std::string lastPath;
   std::string lastLockName;
+  // Locks this process holds, by the identity of the lock directory, so that a file
+  // locked for writing can be read by the same process without waiting for itself.
+  struct Held {
+    dev_t dev;
+    ino_t ino;
+    unsigned depth;
+  };
+  std::vector<Held> held;
 };
 
 LockSettings& settings() {
@@ -27,6 +36,12 @@ LockSettings& settings() {
 }
 
 unsigned g_consoleWaits = 0;
+
+LockSettings::Held* heldLock(const struct stat& st) {
+  for (auto& h : settings().held)
+    if (h.dev == st.st_dev && h.ino == st.st_ino) return &h;
+  return nullptr;
+}
 
 constexpr size_t kLockNameBuffer = 4096;
 
@@ -72,6 +87,10 @@ ErrorCode lockKgvFile(const std::string& path) {
     struct stat st;
     bool exists = lstat(name.c_str(), &st) == 0;
     if (exists) {
+      if (LockSettings::Held* h = heldLock(st)) {
+        ++h->depth;
+        return allOK;
+      }
       long age = static_cast<long>(time(nullptr)) - static_cast<long>(st.st_ctime);
       if (age < 0) age = 0;
       if (age > s.breakAge) {
@@ -87,7 +106,11 @@ ErrorCode lockKgvFile(const std::string& path) {
       int made = mkdir(name.c_str(), 0777);
       int err = errno;
       (void)!chmod(name.c_str(), 0222);
-      if (made == 0) return allOK;
+      if (made == 0) {
+        struct stat mine;
+        if (lstat(name.c_str(), &mine) == 0) s.held.push_back({mine.st_dev, mine.st_ino, 1});
+        return allOK;
+      }
       if (err != EEXIST) {
         recordSystemError(err, "Lock name: %s", name.c_str());
         return lockDirNotCreated;
@@ -113,6 +136,13 @@ ErrorCode unlockKgvFile(const std::string& path) {
   if (rc != allOK) return rc;
   s.lastPath = path;
   s.lastLockName = name;
+  struct stat st;
+  if (lstat(name.c_str(), &st) == 0) {
+    if (LockSettings::Held* h = heldLock(st)) {
+      if (--h->depth > 0) return allOK;
+      s.held.erase(s.held.begin() + (h - s.held.data()));
+    }
+  }
   if (rmdir(name.c_str()) == 0 || errno == ENOENT) return allOK;
   recordSystemError(errno, "Lock name: %s", name.c_str());
   return lockDirNotRemove;

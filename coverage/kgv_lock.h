@@ -16,6 +16,8 @@ enum LockEvent : int {
 using LockWaitCallback =
     std::function<bool(int event, const std::string& path, const std::string& lockName)>;
 
+// A process that holds a lock may take it again (under any name of the same lock
+// directory) without waiting for itself; the directory goes with the last unlock.
 // 1 when held (or locking is off); 45 abandoned; 46 empty path; 47 too long; 48 an old
 // lock could not be removed; 49 the lock could not be created; 51 too many tries; 52 too
 // many lost races.
