@@ -40,12 +40,6 @@ std::unique_ptr<KgvData> copyKgvData(const KgvData& d) {
 void setHitFlagsMode(bool hitFlagsOnly) { g_hitFlagsMode = hitFlagsOnly; }
 bool hitFlagsMode() { return g_hitFlagsMode; }
 
-std::uint16_t combineCounts(std::uint16_t a, std::uint16_t b, bool hitFlagsOnly) {
-  if (hitFlagsOnly) return (a != 0 || b != 0) ? 1 : 0;
-  std::uint32_t sum = std::uint32_t(a) + b;
-  return static_cast<std::uint16_t>(sum > kCountLimit ? kCountLimit : sum);
-}
-
 std::uint16_t combineCounts(std::uint16_t a, std::uint16_t b) {
   return combineCounts(a, b, g_hitFlagsMode);
 }

@@ -105,7 +105,11 @@ std::unique_ptr<KgvData> copyKgvData(const KgvData& d);
 // set by a merge from the data merged into.
 void setHitFlagsMode(bool hitFlagsOnly);
 bool hitFlagsMode();
-std::uint16_t combineCounts(std::uint16_t a, std::uint16_t b, bool hitFlagsOnly);
+inline std::uint16_t combineCounts(std::uint16_t a, std::uint16_t b, bool hitFlagsOnly) {
+  if (hitFlagsOnly) return (a != 0 || b != 0) ? 1 : 0;
+  std::uint32_t sum = std::uint32_t(a) + b;
+  return static_cast<std::uint16_t>(sum > kCountLimit ? kCountLimit : sum);
+}
 std::uint16_t combineCounts(std::uint16_t a, std::uint16_t b);
 
 bool sameVersion(const ObjRecord& a, const ObjRecord& b);

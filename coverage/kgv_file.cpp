@@ -8,6 +8,10 @@
 #include <cstring>
 #include <ctime>
 
+#include <sys/stat.h>
+#include <sys/uio.h>
+#include <unistd.h>
+
 #include "startup/atomic_write.h"
 
 namespace {
@@ -30,27 +34,31 @@ using FilePtr = std::unique_ptr<FILE, FileCloser>;
 
 // Reads exactly n bytes into buf (resized); grows the buffer only as data arrive, so a
 // hostile size cannot make it allocate more than the file holds.
-ErrorCode readExact(FILE* f, std::uint64_t n, std::vector<unsigned char>& buf) {
-  buf.clear();
-  std::uint64_t done = 0;
-  while (done < n) {
-    size_t want = static_cast<size_t>(std::min<std::uint64_t>(n - done, kChunk));
-    buf.resize(static_cast<size_t>(done) + want);
-    size_t got = fread(buf.data() + done, 1, want, f);
-    done += got;
-    if (got < want) {
+// Reads n bytes into buf; got says how many arrived. Room grows by at most a chunk
+// beyond the data read.
+ErrorCode readExact(FILE* f, std::uint64_t n, KgvReadBuffer& buf, const unsigned char*& data,
+                    std::uint64_t& got, size_t chunk = kChunk) {
+  got = 0;
+  unsigned char* p = buf.reserve(0);
+  while (got < n) {
+    size_t want = static_cast<size_t>(std::min<std::uint64_t>(n - got, chunk));
+    p = buf.reserve(static_cast<size_t>(got) + want);
+    size_t part = fread(p + got, 1, want, f);
+    got += part;
+    if (part < want) {
       if (ferror(f)) recordSystemError(errno ? errno : EIO);
-      buf.resize(static_cast<size_t>(done));
+      data = p;
       return fileTooShort;
     }
   }
+  data = p;
   return allOK;
 }
 
 // Turns the bytes of one record into an ObjRecord; codes 28, 34 and 35.
-ErrorCode parseRecord(std::vector<unsigned char>& buf, bool swapped, ObjRecord& r) {
-  if (buf.size() < sizeof(ObjHeader)) return corruptKgvFile;
-  std::memcpy(&r.objHeader, buf.data(), sizeof(ObjHeader));
+ErrorCode parseRecord(const unsigned char* rec, size_t size, bool swapped, ObjRecord& r) {
+  if (size < sizeof(ObjHeader)) return corruptKgvFile;
+  std::memcpy(&r.objHeader, rec, sizeof(ObjHeader));
   ObjHeader& h = r.objHeader;
   if (swapped) {
     for (std::uint32_t* w : {&h.signature, &h.buildTime, &h.firstTime, &h.lastTime,
@@ -60,18 +68,18 @@ ErrorCode parseRecord(std::vector<unsigned char>& buf, bool swapped, ObjRecord& 
   std::uint64_t strBytes = std::uint64_t(h.stringWords) * 4;
   std::uint64_t n = h.mapCount;
   std::uint64_t need = sizeof(ObjHeader) + strBytes + 6 * n;
-  if (need > buf.size()) return corruptKgvFile;
-  const unsigned char* p = buf.data() + sizeof(ObjHeader);
+  if (need > size) return corruptKgvFile;
+  const unsigned char* p = rec + sizeof(ObjHeader);
   r.strings.assign(p, p + strBytes);
   p += strBytes;
-  r.map.resize(static_cast<size_t>(n));
-  if (n) std::memcpy(r.map.data(), p, static_cast<size_t>(4 * n));
+  // Records start on word boundaries of the read buffer, so map and counts are aligned.
+  const auto* map = reinterpret_cast<const std::uint32_t*>(p);
+  r.map.assign(map, map + n);
   p += 4 * n;
-  r.counts.resize(static_cast<size_t>(n));
-  if (n) std::memcpy(r.counts.data(), p, static_cast<size_t>(2 * n));
+  const auto* counts = reinterpret_cast<const std::uint16_t*>(p);
+  r.counts.assign(counts, counts + n);
   p += 2 * n;
-  const unsigned char* end = buf.data() + buf.size();
-  r.tail.assign(p, end);
+  r.tail.assign(p, rec + size);
   if (swapped) {
     for (auto& e : r.map) e = bswap32(e);
     for (auto& c : r.counts) c = bswap16(c);
@@ -100,12 +108,47 @@ ErrorCode parseRecord(std::vector<unsigned char>& buf, bool swapped, ObjRecord& 
   return allOK;
 }
 
-bool writeAll(FILE* f, const void* p, size_t n) {
-  if (n == 0) return true;
-  if (fwrite(p, 1, n, f) == n) return true;
-  recordSystemError(errno ? errno : EIO);
-  return false;
-}
+// Collects the parts of many records and hands them to the system in few calls, straight
+// from where they lie in memory.
+class GatherWriter {
+ public:
+  explicit GatherWriter(int fd) : fd_(fd) {}
+  bool add(const void* p, size_t n) {
+    if (n == 0) return true;
+    iov_.push_back({const_cast<void*>(p), n});
+    return iov_.size() < kMaxParts || flush();
+  }
+  bool flush() {
+    size_t first = 0;
+    while (first < iov_.size()) {
+      int count = static_cast<int>(std::min<size_t>(iov_.size() - first, kMaxParts));
+      ssize_t done = writev(fd_, iov_.data() + first, count);
+      if (done < 0) {
+        if (errno == EINTR) continue;
+        recordSystemError(errno);
+        return false;
+      }
+      if (done == 0) {
+        recordSystemError(EIO);
+        return false;
+      }
+      // Step over what was written; a part written in part is shortened.
+      auto left = static_cast<size_t>(done);
+      while (left > 0 && left >= iov_[first].iov_len) left -= iov_[first++].iov_len;
+      if (left > 0) {
+        iov_[first].iov_base = static_cast<char*>(iov_[first].iov_base) + left;
+        iov_[first].iov_len -= left;
+      }
+    }
+    iov_.clear();
+    return true;
+  }
+
+ private:
+  static constexpr size_t kMaxParts = 1024;
+  int fd_;
+  std::vector<iovec> iov_;
+};
 
 }  // namespace
 
@@ -124,22 +167,38 @@ ErrorCode checkKgvHeader(const unsigned char* raw, bool* swapped) {
   return notOurFile;
 }
 
-ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out) {
+unsigned char* KgvReadBuffer::reserve(std::size_t n) {
+  if (n > capacity_ || !data_) {
+    // Growing keeps what was read so far.
+    std::size_t cap = std::max<std::size_t>(n, 64);
+    std::unique_ptr<unsigned char[]> bigger(new unsigned char[cap]);
+    if (data_ && capacity_) std::memcpy(bigger.get(), data_.get(), std::min(capacity_, cap));
+    data_ = std::move(bigger);
+    capacity_ = cap;
+  }
+  return data_.get();
+}
+
+ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out,
+                      KgvReadBuffer* buffer) {
   out.reset();
   FilePtr f(fopen(path.c_str(), "rb"));
   if (!f) {
     recordSystemError(errno);
     return openError;
   }
+  KgvReadBuffer local;
+  KgvReadBuffer& buf = buffer ? *buffer : local;
   auto data = std::make_unique<KgvData>();
-  std::vector<unsigned char> buf;
-  ErrorCode rc = readExact(f.get(), sizeof(KgvHeader), buf);
+  const unsigned char* bytes = nullptr;
+  std::uint64_t got = 0;
+  ErrorCode rc = readExact(f.get(), sizeof(KgvHeader), buf, bytes, got);
   if (rc != allOK) return rc;
   bool swapped = false;
-  rc = checkKgvHeader(buf.data(), &swapped);
+  rc = checkKgvHeader(bytes, &swapped);
   if (rc != allOK) return rc;
   KgvHeader& h = data->header;
-  std::memcpy(&h, buf.data(), sizeof h);
+  std::memcpy(&h, bytes, sizeof h);
   if (swapped) {
     // Every numeric word of the header; the reserved bytes are carried as they are.
     for (std::uint32_t* w : {&h.magic, &h.fileKind, &h.formatVersion, &h.oldestReader, &h.magic2,
@@ -149,22 +208,37 @@ ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out) {
   }
   if (h.recordCount == 0) return corruptKgvFile;
 
-  rc = readExact(f.get(), std::uint64_t(h.recordCount) * 4, buf);
+  // A regular file's size bounds what may be asked for; a pipe's data are read as they come.
+  struct stat st;
+  bool regular = fstat(fileno(f.get()), &st) == 0 && S_ISREG(st.st_mode);
+  std::uint64_t indexEnd = sizeof(KgvHeader) + std::uint64_t(h.recordCount) * 4;
+  if (regular && std::uint64_t(st.st_size) < indexEnd) return fileTooShort;
+  rc = readExact(f.get(), std::uint64_t(h.recordCount) * 4, buf, bytes, got);
   if (rc != allOK) return rc;
   data->recordSizes.resize(h.recordCount);
-  std::memcpy(data->recordSizes.data(), buf.data(), buf.size());
+  std::memcpy(data->recordSizes.data(), bytes, static_cast<size_t>(got));
   if (swapped)
     for (auto& s : data->recordSizes) s = bswap32(s);
 
+  // All records in one read: the index gives their total size, and for a regular file no
+  // more than the file holds is asked for. A record beyond what could be read is short.
+  std::uint64_t total = 0;
+  for (std::uint32_t words : data->recordSizes) total += std::uint64_t(words) * 4;
+  if (regular) total = std::min<std::uint64_t>(total, st.st_size - indexEnd);
+  rc = readExact(f.get(), total, buf, bytes, got, regular ? static_cast<size_t>(total) : kChunk);
+  if (rc != allOK && ferror(f.get())) return rc;
+  clearPendingSystemError();
+
   data->records.reserve(std::min<std::uint32_t>(h.recordCount, 1u << 16));
+  std::uint64_t at = 0;
   for (std::uint32_t i = 0; i < h.recordCount; ++i) {
-    std::uint32_t words = data->recordSizes[i];
-    if (words == 0) return corruptKgvFile;
-    rc = readExact(f.get(), std::uint64_t(words) * 4, buf);
-    if (rc != allOK) return rc;
+    std::uint64_t size = std::uint64_t(data->recordSizes[i]) * 4;
+    if (size == 0) return corruptKgvFile;
+    if (size > got - at) return fileTooShort;
     auto r = std::make_unique<ObjRecord>();
-    rc = parseRecord(buf, swapped, *r);
+    rc = parseRecord(bytes + at, static_cast<size_t>(size), swapped, *r);
     if (rc != allOK) return rc;
+    at += size;
     data->records.push_back(std::move(r));
   }
   data->mergeMode = 1;
@@ -176,7 +250,7 @@ ErrorCode writeKgvFile(const std::string& path, KgvData& data) {
   AtomicFileWriter w;
   ErrorCode rc = w.open(path);
   if (rc != allOK) return rc;
-  FILE* f = w.stream();
+  GatherWriter out(fileno(w.stream()));  // nothing goes through the stream's own buffer
   std::uint32_t now = static_cast<std::uint32_t>(time(nullptr));
 
   // The index comes first in the file, so every record's size is settled before writing.
@@ -188,11 +262,11 @@ ErrorCode writeKgvFile(const std::string& path, KgvData& data) {
   }
   data.header.saveTime = now;
   data.header.recordCount = static_cast<std::uint32_t>(data.records.size());
-  if (!writeAll(f, &data.header, sizeof data.header) ||
-      !writeAll(f, data.recordSizes.data(), data.recordSizes.size() * 4))
+  if (!out.add(&data.header, sizeof data.header) ||
+      !out.add(data.recordSizes.data(), data.recordSizes.size() * 4))
     return fileWriteFailed;
 
-  static const unsigned char zeros[64] = {};
+  static const unsigned char zeros[256] = {};
   for (size_t i = 0; i < data.records.size(); ++i) {
     ObjRecord& r = *data.records[i];
     ObjHeader& h = r.objHeader;
@@ -202,18 +276,18 @@ ErrorCode writeKgvFile(const std::string& path, KgvData& data) {
     h.mapCount = static_cast<std::uint32_t>(r.map.size());
     std::uint64_t parts = sizeof h + r.strings.size() + 6 * std::uint64_t(r.map.size());
     std::uint64_t rest = std::uint64_t(data.recordSizes[i]) * 4 - parts;
-    if (!writeAll(f, &h, sizeof h) || !writeAll(f, r.strings.data(), r.strings.size()) ||
-        !writeAll(f, r.map.data(), r.map.size() * 4) ||
-        !writeAll(f, r.counts.data(), r.counts.size() * 2))
+    if (!out.add(&h, sizeof h) || !out.add(r.strings.data(), r.strings.size()) ||
+        !out.add(r.map.data(), r.map.size() * 4) || !out.add(r.counts.data(), r.counts.size() * 2))
       return fileWriteFailed;
     // What follows the parts: the record's own tail as read, else zero padding.
     size_t fromTail = static_cast<size_t>(std::min<std::uint64_t>(rest, r.tail.size()));
-    if (!writeAll(f, r.tail.data(), fromTail)) return fileWriteFailed;
+    if (!out.add(r.tail.data(), fromTail)) return fileWriteFailed;
     for (std::uint64_t left = rest - fromTail; left > 0;) {
       size_t n = static_cast<size_t>(std::min<std::uint64_t>(left, sizeof zeros));
-      if (!writeAll(f, zeros, n)) return fileWriteFailed;
+      if (!out.add(zeros, n)) return fileWriteFailed;
       left -= n;
     }
   }
+  if (!out.flush()) return fileWriteFailed;
   return w.commit();
 }

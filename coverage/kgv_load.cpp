@@ -15,12 +15,14 @@ bool g_isJava = false;
 bool kgvIsJava() { return g_isJava; }
 void setKgvIsJava(bool isJava) { g_isJava = isJava; }
 
-ErrorCode loadKgvFile(KgvFileRef& ref, std::unique_ptr<KgvData>& out) {
+namespace {
+
+ErrorCode loadWithBuffer(KgvFileRef& ref, std::unique_ptr<KgvData>& out, KgvReadBuffer* buffer) {
   out.reset();
   ErrorCode rc = lockKgvFile(ref.givenName);
   if (rc != allOK) return rc;
   try {
-    rc = readKgvFile(ref.givenName, out);
+    rc = readKgvFile(ref.givenName, out, buffer);
   } catch (const std::bad_alloc&) {
     out.reset();
     rc = outOfMemory;
@@ -34,6 +36,12 @@ ErrorCode loadKgvFile(KgvFileRef& ref, std::unique_ptr<KgvData>& out) {
   return rc;
 }
 
+}  // namespace
+
+ErrorCode loadKgvFile(KgvFileRef& ref, std::unique_ptr<KgvData>& out) {
+  return loadWithBuffer(ref, out, nullptr);
+}
+
 ErrorCode loadAllKgvFiles(std::vector<KgvFileRef>& files, std::uint32_t mergeMode,
                           std::vector<std::string>* ignored, std::unique_ptr<KgvData>& out,
                           std::size_t& fileCountOrFailedIndex) {
@@ -45,9 +53,10 @@ ErrorCode loadAllKgvFiles(std::vector<KgvFileRef>& files, std::uint32_t mergeMod
   std::unique_ptr<KgvData> acc;
   std::unique_ptr<KgvMerger> merger;
   bool anyIgnored = false;
+  KgvReadBuffer buffer;  // one for all files
   for (size_t i = 0; i < files.size(); ++i) {
     std::unique_ptr<KgvData> data;
-    ErrorCode rc = loadKgvFile(files[i], data);
+    ErrorCode rc = loadWithBuffer(files[i], data, &buffer);
     if (rc == allOK && !acc) {
       acc = std::move(data);
       setKgvIsJava(acc->header.isJava != 0);
