@@ -50,8 +50,10 @@ bool sameVersion(const ObjRecord& a, const ObjRecord& b) {
 }
 
 bool isNewer(const ObjRecord& a, const ObjRecord& b) {
-  const ObjHeader& x = a.objHeader;
-  const ObjHeader& y = b.objHeader;
+  return isNewerHeader(a.objHeader, b.objHeader);
+}
+
+bool isNewerHeader(const ObjHeader& x, const ObjHeader& y) {
   if (x.buildTime != y.buildTime) return x.buildTime > y.buildTime;
   if (x.lastTime != y.lastTime) return x.lastTime > y.lastTime;
   return x.firstTime > y.firstTime;

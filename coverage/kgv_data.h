@@ -114,3 +114,4 @@ std::uint16_t combineCounts(std::uint16_t a, std::uint16_t b);
 
 bool sameVersion(const ObjRecord& a, const ObjRecord& b);
 bool isNewer(const ObjRecord& a, const ObjRecord& b);
+bool isNewerHeader(const ObjHeader& a, const ObjHeader& b);

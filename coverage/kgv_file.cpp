@@ -32,8 +32,6 @@ struct FileCloser {
 };
 using FilePtr = std::unique_ptr<FILE, FileCloser>;
 
-// Reads exactly n bytes into buf (resized); grows the buffer only as data arrive, so a
-// hostile size cannot make it allocate more than the file holds.
 // Reads n bytes into buf; got says how many arrived. Room grows by at most a chunk
 // beyond the data read.
 ErrorCode readExact(FILE* f, std::uint64_t n, KgvReadBuffer& buf, const unsigned char*& data,
@@ -55,11 +53,12 @@ ErrorCode readExact(FILE* f, std::uint64_t n, KgvReadBuffer& buf, const unsigned
   return allOK;
 }
 
-// Turns the bytes of one record into an ObjRecord; codes 28, 34 and 35.
-ErrorCode parseRecord(const unsigned char* rec, size_t size, bool swapped, ObjRecord& r) {
+// Checks one record where it lies and describes it; codes 28, 34 and 35. Nothing outside
+// the record's bytes is ever read.
+ErrorCode checkRecord(const unsigned char* rec, size_t size, bool swapped, KgvRecordBytes& r) {
   if (size < sizeof(ObjHeader)) return corruptKgvFile;
-  std::memcpy(&r.objHeader, rec, sizeof(ObjHeader));
-  ObjHeader& h = r.objHeader;
+  std::memcpy(&r.header, rec, sizeof(ObjHeader));
+  ObjHeader& h = r.header;
   if (swapped) {
     for (std::uint32_t* w : {&h.signature, &h.buildTime, &h.firstTime, &h.lastTime,
                              &h.stringWords, &h.mapCount})
@@ -67,39 +66,33 @@ ErrorCode parseRecord(const unsigned char* rec, size_t size, bool swapped, ObjRe
   }
   std::uint64_t strBytes = std::uint64_t(h.stringWords) * 4;
   std::uint64_t n = h.mapCount;
-  std::uint64_t need = sizeof(ObjHeader) + strBytes + 6 * n;
-  if (need > size) return corruptKgvFile;
-  const unsigned char* p = rec + sizeof(ObjHeader);
-  r.strings.assign(p, p + strBytes);
-  p += strBytes;
+  if (sizeof(ObjHeader) + strBytes + 6 * n > size) return corruptKgvFile;
+  r.data = rec;
+  r.size = size;
+  r.swapped = swapped;
+  r.strings = reinterpret_cast<const char*>(rec + sizeof(ObjHeader));
+  r.stringBytes = static_cast<size_t>(strBytes);
   // Records start on word boundaries of the read buffer, so map and counts are aligned.
-  const auto* map = reinterpret_cast<const std::uint32_t*>(p);
-  r.map.assign(map, map + n);
-  p += 4 * n;
-  const auto* counts = reinterpret_cast<const std::uint16_t*>(p);
-  r.counts.assign(counts, counts + n);
-  p += 2 * n;
-  r.tail.assign(p, rec + size);
-  if (swapped) {
-    for (auto& e : r.map) e = bswap32(e);
-    for (auto& c : r.counts) c = bswap16(c);
-  }
-  r.fromFile = true;
+  r.map = reinterpret_cast<const std::uint32_t*>(rec + sizeof(ObjHeader) + strBytes);
+  r.counts = reinterpret_cast<const std::uint16_t*>(rec + sizeof(ObjHeader) + strBytes + 4 * n);
+  r.mapCount = static_cast<size_t>(n);
 
-  if (n == 0 || mapTag(r.map[0]) != TagFile) return filenameNotFirst;
+  auto entry = [&](size_t i) { return swapped ? bswap32(r.map[i]) : r.map[i]; };
+  if (n == 0 || mapTag(entry(0)) != TagFile) return filenameNotFirst;
   // A name must start inside the string area and end there with a NUL.
   std::int64_t lastNul = -1;
-  for (std::int64_t i = static_cast<std::int64_t>(r.strings.size()) - 1; i >= 0; --i) {
-    if (r.strings[static_cast<size_t>(i)] == '\0') {
+  for (std::int64_t i = static_cast<std::int64_t>(strBytes) - 1; i >= 0; --i) {
+    if (r.strings[i] == '\0') {
       lastNul = i;
       break;
     }
   }
-  std::uint32_t fileOff = mapValue(r.map[0]);
+  std::uint32_t fileOff = mapValue(entry(0));
   if (static_cast<std::int64_t>(fileOff) > lastNul) return corruptKgvFile;
   if (r.strings[fileOff] == '\0') return filenameEmpty;
   r.fileNameOffset = fileOff;
-  for (std::uint32_t e : r.map) {
+  for (size_t i = 0; i < n; ++i) {
+    std::uint32_t e = entry(i);
     std::uint32_t tag = mapTag(e);
     if ((tag == TagFile || tag == TagFunction) &&
         static_cast<std::int64_t>(mapValue(e)) > lastNul)
@@ -108,46 +101,48 @@ ErrorCode parseRecord(const unsigned char* rec, size_t size, bool swapped, ObjRe
   return allOK;
 }
 
-// Collects the parts of many records and hands them to the system in few calls, straight
-// from where they lie in memory.
+// Collects the parts of many records in a large buffer and hands it to the system in few
+// calls.
 class GatherWriter {
  public:
-  explicit GatherWriter(int fd) : fd_(fd) {}
+  explicit GatherWriter(int fd) : fd_(fd), buf_(new char[kSize]) {}
   bool add(const void* p, size_t n) {
-    if (n == 0) return true;
-    iov_.push_back({const_cast<void*>(p), n});
-    return iov_.size() < kMaxParts || flush();
+    const char* c = static_cast<const char*>(p);
+    while (n > 0) {
+      size_t room = kSize - used_;
+      size_t k = std::min(room, n);
+      std::memcpy(buf_.get() + used_, c, k);
+      used_ += k;
+      c += k;
+      n -= k;
+      if (used_ == kSize && !flush()) return false;
+    }
+    return true;
   }
   bool flush() {
-    size_t first = 0;
-    while (first < iov_.size()) {
-      int count = static_cast<int>(std::min<size_t>(iov_.size() - first, kMaxParts));
-      ssize_t done = writev(fd_, iov_.data() + first, count);
-      if (done < 0) {
+    size_t done = 0;
+    while (done < used_) {
+      ssize_t w = write(fd_, buf_.get() + done, used_ - done);
+      if (w < 0) {
         if (errno == EINTR) continue;
         recordSystemError(errno);
         return false;
       }
-      if (done == 0) {
+      if (w == 0) {
         recordSystemError(EIO);
         return false;
       }
-      // Step over what was written; a part written in part is shortened.
-      auto left = static_cast<size_t>(done);
-      while (left > 0 && left >= iov_[first].iov_len) left -= iov_[first++].iov_len;
-      if (left > 0) {
-        iov_[first].iov_base = static_cast<char*>(iov_[first].iov_base) + left;
-        iov_[first].iov_len -= left;
-      }
+      done += static_cast<size_t>(w);
     }
-    iov_.clear();
+    used_ = 0;
     return true;
   }
 
  private:
-  static constexpr size_t kMaxParts = 1024;
+  static constexpr size_t kSize = size_t(4) << 20;
   int fd_;
-  std::vector<iovec> iov_;
+  std::unique_ptr<char[]> buf_;
+  size_t used_ = 0;
 };
 
 }  // namespace
@@ -179,9 +174,25 @@ unsigned char* KgvReadBuffer::reserve(std::size_t n) {
   return data_.get();
 }
 
-ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out,
-                      KgvReadBuffer* buffer) {
-  out.reset();
+std::unique_ptr<ObjRecord> makeObjRecord(const KgvRecordBytes& b) {
+  auto r = std::make_unique<ObjRecord>();
+  r->objHeader = b.header;
+  r->strings.assign(b.strings, b.strings + b.stringBytes);
+  r->map.assign(b.map, b.map + b.mapCount);
+  r->counts.assign(b.counts, b.counts + b.mapCount);
+  if (b.swapped) {
+    for (auto& e : r->map) e = bswap32(e);
+    for (auto& c : r->counts) c = bswap16(c);
+  }
+  const unsigned char* end = b.data + b.size;
+  r->tail.assign(reinterpret_cast<const unsigned char*>(b.counts + b.mapCount), end);
+  r->fileNameOffset = b.fileNameOffset;
+  r->fromFile = true;
+  return r;
+}
+
+ErrorCode readKgvRecords(const std::string& path, KgvReadBuffer* buffer,
+                         KgvRecordVisitor& visitor) {
   FilePtr f(fopen(path.c_str(), "rb"));
   if (!f) {
     recordSystemError(errno);
@@ -189,7 +200,6 @@ ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out,
   }
   KgvReadBuffer local;
   KgvReadBuffer& buf = buffer ? *buffer : local;
-  auto data = std::make_unique<KgvData>();
   const unsigned char* bytes = nullptr;
   std::uint64_t got = 0;
   ErrorCode rc = readExact(f.get(), sizeof(KgvHeader), buf, bytes, got);
@@ -197,7 +207,7 @@ ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out,
   bool swapped = false;
   rc = checkKgvHeader(bytes, &swapped);
   if (rc != allOK) return rc;
-  KgvHeader& h = data->header;
+  KgvHeader h;
   std::memcpy(&h, bytes, sizeof h);
   if (swapped) {
     // Every numeric word of the header; the reserved bytes are carried as they are.
@@ -215,34 +225,58 @@ ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out,
   if (regular && std::uint64_t(st.st_size) < indexEnd) return fileTooShort;
   rc = readExact(f.get(), std::uint64_t(h.recordCount) * 4, buf, bytes, got);
   if (rc != allOK) return rc;
-  data->recordSizes.resize(h.recordCount);
-  std::memcpy(data->recordSizes.data(), bytes, static_cast<size_t>(got));
+  std::vector<std::uint32_t> sizes(h.recordCount);
+  std::memcpy(sizes.data(), bytes, static_cast<size_t>(got));
   if (swapped)
-    for (auto& s : data->recordSizes) s = bswap32(s);
+    for (auto& s : sizes) s = bswap32(s);
+  rc = visitor.header(h, sizes);
+  if (rc != allOK) return rc;
 
   // All records in one read: the index gives their total size, and for a regular file no
   // more than the file holds is asked for. A record beyond what could be read is short.
   std::uint64_t total = 0;
-  for (std::uint32_t words : data->recordSizes) total += std::uint64_t(words) * 4;
+  for (std::uint32_t words : sizes) total += std::uint64_t(words) * 4;
   if (regular) total = std::min<std::uint64_t>(total, st.st_size - indexEnd);
   rc = readExact(f.get(), total, buf, bytes, got, regular ? static_cast<size_t>(total) : kChunk);
   if (rc != allOK && ferror(f.get())) return rc;
   clearPendingSystemError();
 
-  data->records.reserve(std::min<std::uint32_t>(h.recordCount, 1u << 16));
   std::uint64_t at = 0;
   for (std::uint32_t i = 0; i < h.recordCount; ++i) {
-    std::uint64_t size = std::uint64_t(data->recordSizes[i]) * 4;
+    std::uint64_t size = std::uint64_t(sizes[i]) * 4;
     if (size == 0) return corruptKgvFile;
     if (size > got - at) return fileTooShort;
-    auto r = std::make_unique<ObjRecord>();
-    rc = parseRecord(bytes + at, static_cast<size_t>(size), swapped, *r);
+    KgvRecordBytes record;
+    rc = checkRecord(bytes + at, static_cast<size_t>(size), swapped, record);
+    if (rc != allOK) return rc;
+    rc = visitor.record(record);
     if (rc != allOK) return rc;
     at += size;
-    data->records.push_back(std::move(r));
   }
-  data->mergeMode = 1;
-  out = std::move(data);
+  return allOK;
+}
+
+ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out,
+                      KgvReadBuffer* buffer) {
+  out.reset();
+  // Every record copied out as it is.
+  struct Collect : KgvRecordVisitor {
+    std::unique_ptr<KgvData> data = std::make_unique<KgvData>();
+    ErrorCode header(const KgvHeader& h, const std::vector<std::uint32_t>& sizes) override {
+      data->header = h;
+      data->recordSizes = sizes;
+      data->records.reserve(std::min<size_t>(sizes.size(), 1u << 16));
+      return allOK;
+    }
+    ErrorCode record(const KgvRecordBytes& b) override {
+      data->records.push_back(makeObjRecord(b));
+      return allOK;
+    }
+  } collect;
+  ErrorCode rc = readKgvRecords(path, buffer, collect);
+  if (rc != allOK) return rc;
+  collect.data->mergeMode = 1;
+  out = std::move(collect.data);
   return allOK;
 }
 

@@ -3,6 +3,7 @@
 
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "adjust/errors.h"
 #include "coverage/kgv_data.h"
@@ -23,6 +24,38 @@ class KgvReadBuffer {
   std::unique_ptr<unsigned char[]> data_;
   std::size_t capacity_ = 0;
 };
+
+// One record where it lies in the bytes read from a file, already checked. Map and counts
+// are as in the file: reversed only when swapped says so. Valid during the visit only.
+struct KgvRecordBytes {
+  const unsigned char* data = nullptr;  // the record's bytes, as many as its index entry says
+  std::size_t size = 0;
+  bool swapped = false;
+  ObjHeader header;  // in this machine's byte order; reserved bytes as in the file
+  const char* strings = nullptr;
+  std::size_t stringBytes = 0;
+  const std::uint32_t* map = nullptr;
+  const std::uint16_t* counts = nullptr;
+  std::size_t mapCount = 0;
+  std::uint32_t fileNameOffset = 0;
+  const char* fileName() const { return strings + fileNameOffset; }
+};
+
+// A record copied out of the file's bytes, in this machine's byte order.
+std::unique_ptr<ObjRecord> makeObjRecord(const KgvRecordBytes& bytes);
+
+// Receives a file's header and index, then its records in order; a code other than 1 ends
+// the read with that code.
+class KgvRecordVisitor {
+ public:
+  virtual ~KgvRecordVisitor() = default;
+  virtual ErrorCode header(const KgvHeader& header, const std::vector<std::uint32_t>& sizes) = 0;
+  virtual ErrorCode record(const KgvRecordBytes& record) = 0;
+};
+
+// Reads a file with all the checks of readKgvFile, handing each record to the visitor as
+// soon as it is checked.
+ErrorCode readKgvRecords(const std::string& path, KgvReadBuffer* buffer, KgvRecordVisitor& visitor);
 
 // Reads a whole data file. On failure no data are returned. The caller holds the lock.
 ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out,

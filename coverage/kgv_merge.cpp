@@ -7,6 +7,7 @@
 #include <ctime>
 #include <new>
 
+#include "coverage/kgv_file.h"
 #include "coverage/string_block.h"
 
 namespace {
@@ -146,47 +147,52 @@ void addNames(StringBlock& block, const ObjRecord& r) {
 
 }  // namespace
 
-void countMergeRecords(ObjRecord& x, ObjRecord& r, bool hitFlagsOnly) {
+void countMergeArrays(ObjRecord& x, const ObjHeader& rh, const std::uint32_t* rmap,
+                      const std::uint16_t* rcounts, size_t n, bool hitFlagsOnly) {
   ObjHeader& xh = x.objHeader;
-  mergeTimes(xh, xh, r.objHeader);
-  xh.buildTime = std::max(xh.buildTime, r.objHeader.buildTime);
+  mergeTimes(xh, xh, rh);
+  xh.buildTime = std::max(xh.buildTime, rh.buildTime);
 
-  // Where one side splits a block that the other records as a further line of the block
-  // before, both get the block's count there so the sums line up. The nearest preceding
-  // block counts are taken before any sum is formed.
-  size_t n = std::min(x.map.size(), r.map.size());
-  if (n && std::memcmp(x.map.data(), r.map.data(), n * 4) == 0) {
+  n = std::min(n, x.map.size());
+  if (n && std::memcmp(x.map.data(), rmap, n * 4) == 0) {
     // The usual case, identical maps: a plain pass that the compiler can vectorise.
     const std::uint32_t* map = x.map.data();
     std::uint16_t* xc = x.counts.data();
-    const std::uint16_t* rc = r.counts.data();
     for (size_t i = 0; i < n; ++i) {
       std::uint32_t tag = map[i] >> 28;
       bool counted = tag == TagFile || tag == TagFunction || tag == TagBlock;
-      std::uint32_t sum = std::uint32_t(xc[i]) + rc[i];
+      std::uint32_t sum = std::uint32_t(xc[i]) + rcounts[i];
       std::uint32_t combined = hitFlagsOnly ? std::uint32_t(sum != 0)
                                             : std::min<std::uint32_t>(sum, kCountLimit);
       xc[i] = static_cast<std::uint16_t>(counted ? combined : xc[i]);
     }
     return;
   }
+  // Where one side splits a block that the other records as a further line of the block
+  // before, both sides count the block's hits there so the sums line up. The nearest
+  // preceding block counts are taken before any sum is formed.
   std::uint16_t lastX = 0, lastR = 0;
   for (size_t i = 0; i < n; ++i) {
-    std::uint32_t tx = mapTag(x.map[i]), tr = mapTag(r.map[i]);
+    std::uint32_t tx = mapTag(x.map[i]), tr = mapTag(rmap[i]);
+    std::uint16_t rc = rcounts[i];
     if (i > 0) {
       if (tr == TagBlockLine && tx == TagBlock) {
-        r.counts[i] = lastR;
+        rc = lastR;
       } else if (tx == TagBlockLine && tr == TagBlock) {
         x.counts[i] = lastX;
-        x.map[i] = makeMapEntry(TagBlock, mapValue(r.map[i]));
+        x.map[i] = makeMapEntry(TagBlock, mapValue(rmap[i]));
         tx = TagBlock;
       }
       if (tx == TagBlock) lastX = x.counts[i];
-      if (tr == TagBlock) lastR = r.counts[i];
+      if (tr == TagBlock) lastR = rcounts[i];
     }
     if (tx == TagFile || tx == TagFunction || tx == TagBlock)
-      x.counts[i] = combineCounts(x.counts[i], r.counts[i], hitFlagsOnly);
+      x.counts[i] = combineCounts(x.counts[i], rc, hitFlagsOnly);
   }
+}
+
+void countMergeRecords(ObjRecord& x, const ObjRecord& r, bool hitFlagsOnly) {
+  countMergeArrays(x, r.objHeader, r.map.data(), r.counts.data(), r.map.size(), hitFlagsOnly);
 }
 
 std::unique_ptr<ObjRecord> structuralMergeRecords(const ObjRecord& x, const ObjRecord& r,
@@ -283,54 +289,126 @@ void KgvMerger::replace(size_t at, std::unique_ptr<ObjRecord> record) {
   }
 }
 
+namespace {
+
+// A record of the data merged from, held in memory; moved when the data are spent.
+struct RecordSource {
+  std::unique_ptr<ObjRecord>& slot;
+  bool consume;
+  const ObjHeader& header() const { return slot->objHeader; }
+  std::string_view name() const { return slot->fileNameView(); }
+  size_t mapSize() const { return slot->map.size(); }
+  size_t stringBytes() const { return slot->strings.size(); }
+  const std::uint32_t* map() const { return slot->map.data(); }
+  const std::uint16_t* counts() const { return slot->counts.data(); }
+  const ObjRecord& record() { return *slot; }
+  std::unique_ptr<ObjRecord> take() { return consume ? std::move(slot) : copyObjRecord(*slot); }
+};
+
+// A record where it lies in a file being read (this machine's byte order); copied out
+// only when it joins the merged data.
+struct BytesSource {
+  const KgvRecordBytes& b;
+  std::unique_ptr<ObjRecord> made;
+  const ObjHeader& header() const { return b.header; }
+  std::string_view name() const { return b.fileName(); }
+  size_t mapSize() const { return b.mapCount; }
+  size_t stringBytes() const { return b.stringBytes; }
+  const std::uint32_t* map() const { return b.map; }
+  const std::uint16_t* counts() const { return b.counts; }
+  const ObjRecord& record() {
+    if (!made) made = makeObjRecord(b);
+    return *made;
+  }
+  std::unique_ptr<ObjRecord> take() { return made ? std::move(made) : makeObjRecord(b); }
+};
+
+}  // namespace
+
+template <class Source>
+void KgvMerger::mergeOne(std::uint32_t mode, Source& src, std::vector<std::string>* ignored) {
+  auto found = index_.find(src.name());
+  if (found == index_.end()) {
+    a_.records.push_back(src.take());
+    index_.emplace(a_.records.back()->fileNameView(), a_.records.size() - 1);
+    ++a_.header.recordCount;
+    return;
+  }
+  size_t at = found->second;
+  ObjRecord& x = *a_.records[at];
+  const ObjHeader& rh = src.header();
+  bool same = rh.signature != 0 && rh.signature == x.objHeader.signature &&
+              src.mapSize() == x.map.size() && src.stringBytes() == x.strings.size();
+  if (same) {
+    countMergeArrays(x, rh, src.map(), src.counts(), src.mapSize(), hitFlags_);
+  } else if (mode != kMergeForce) {
+    ignoredNow_ = true;
+    if (ignored) ignored->emplace_back(src.name());
+    if (isNewerHeader(rh, x.objHeader)) replace(at, src.take());
+  } else {
+    replace(at, structuralMergeRecords(x, src.record(), hitFlags_));
+  }
+}
+
+void KgvMerger::warnMixedLanguages(bool intoIsJava) {
+  fflush(stdout);
+  fputs(intoIsJava ? "Warn: Found C/C++ .kgv files when processing Java .kgv files.\n"
+                   : "Warn: Found Java .kgv files when processing C/C++ .kgv files.\n",
+        stderr);
+  fflush(stderr);
+}
+
+bool KgvMerger::begin(const KgvHeader& b) {
+  if ((a_.header.isJava != 0) != (b.isJava != 0)) return false;
+  hitFlags_ = a_.header.hitFlagsOnly != 0;
+  setHitFlagsMode(hitFlags_);
+  ignoredNow_ = false;
+  return true;
+}
+
+ErrorCode KgvMerger::add(std::uint32_t mode, const KgvRecordBytes& r,
+                         std::vector<std::string>* ignored) {
+  try {
+    if (r.swapped) {
+      std::unique_ptr<ObjRecord> made = makeObjRecord(r);
+      RecordSource src{made, true};
+      mergeOne(mode, src, ignored);
+    } else {
+      BytesSource src{r, nullptr};
+      mergeOne(mode, src, ignored);
+    }
+  } catch (const std::bad_alloc&) {
+    return outOfMemory;
+  }
+  return allOK;
+}
+
+ErrorCode KgvMerger::finish(std::uint32_t mode, const KgvHeader& b, bool rebuildSizes) {
+  a_.mergeMode = mode;
+  a_.header.clockTime += b.clockTime;
+  a_.header.cpuTime += b.cpuTime;
+  mergedAny_ = true;
+  if (rebuildSizes) rebuildRecordSizes(a_);
+  return ignoredNow_ ? mergeIgnored : allOK;
+}
+
 ErrorCode KgvMerger::merge(std::uint32_t mode, KgvData& b, std::vector<std::string>* ignored,
                            bool consume, bool rebuildSizes) {
-  if ((a_.header.isJava != 0) != (b.header.isJava != 0)) {
-    fflush(stdout);
-    fputs(a_.header.isJava ? "Warn: Found C/C++ .kgv files when processing Java .kgv files.\n"
-                           : "Warn: Found Java .kgv files when processing C/C++ .kgv files.\n",
-          stderr);
-    fflush(stderr);
+  if (!begin(b.header)) {
+    warnMixedLanguages(a_.header.isJava != 0);
     return mergeIgnored;
   }
-  bool hitFlags = a_.header.hitFlagsOnly != 0;
-  setHitFlagsMode(hitFlags);
   ErrorCode rc = allOK;
-  bool anyIgnored = false;
   try {
     for (auto& slot : b.records) {
-      ObjRecord& r = *slot;
-      auto found = index_.find(r.fileNameView());
-      auto take = [&]() { return consume ? std::move(slot) : copyObjRecord(r); };
-      if (found == index_.end()) {
-        std::unique_ptr<ObjRecord> rec = take();
-        a_.records.push_back(std::move(rec));
-        index_.emplace(a_.records.back()->fileNameView(), a_.records.size() - 1);
-        ++a_.header.recordCount;
-        continue;
-      }
-      size_t at = found->second;
-      ObjRecord& x = *a_.records[at];
-      if (sameVersion(x, r)) {
-        countMergeRecords(x, r, hitFlags);
-      } else if (mode != kMergeForce) {
-        anyIgnored = true;
-        if (ignored) ignored->emplace_back(r.fileName());
-        if (isNewer(r, x)) replace(at, take());
-      } else {
-        replace(at, structuralMergeRecords(x, r, hitFlags));
-      }
+      RecordSource src{slot, consume};
+      mergeOne(mode, src, ignored);
     }
   } catch (const std::bad_alloc&) {
     rc = outOfMemory;
   }
-  a_.mergeMode = mode;
-  a_.header.clockTime += b.header.clockTime;
-  a_.header.cpuTime += b.header.cpuTime;
-  mergedAny_ = true;
-  if (rebuildSizes) rebuildRecordSizes(a_);
-  if (rc != allOK) return rc;
-  return anyIgnored ? mergeIgnored : allOK;
+  ErrorCode done = finish(mode, b.header, rebuildSizes);
+  return rc != allOK ? rc : done;
 }
 
 ErrorCode mergeKgvData(std::uint32_t mode, KgvData& a, KgvData& b,

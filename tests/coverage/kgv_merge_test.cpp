@@ -93,6 +93,25 @@ block 4 hits=1
   EXPECT_TRUE(filesIn(dir.path()).size() == 2) << "the locks are gone";
 }
 
+TEST(Merging, RunsWrittenInBothByteOrdersAddUp) {
+  TempDir dir;
+  const char* run = "clockTime 3\nrecord s.c signature=7 build=100 first=50 last=60\n"
+                    "function f line=1 calls=2\nblock 2 hits=2\nblockline 3\nblock 5 hits=0\n";
+  std::string native = makeKgv(dir, "a.kgv", run);
+  std::string swapped = makeKgv(dir, "b.kgv", std::string("order swapped\n") + run);
+  std::string newer = makeKgv(dir, "c.kgv", "order swapped\nrecord s.c signature=8 build=300\n"
+                                            "function g line=9 calls=1\n");
+  for (auto order : {std::vector<std::string>{native, swapped}, std::vector<std::string>{swapped, native}}) {
+    Loaded l = loadAll(order, kMergeNewestWins);
+    ASSERT_EQ(l.rc, allOK);
+    EXPECT_EQ(describeMap(*l.data->records[0]), "F:s.c:2 fn:f:4 fl:1:0 b:2:4 bl:3:0 b:5:0 ");
+    EXPECT_EQ(l.data->header.clockTime, 6u);
+  }
+  Loaded l = loadAll({native, swapped, newer}, kMergeNewestWins);
+  ASSERT_EQ(l.rc, mergeIgnored);
+  EXPECT_EQ(describeMap(*l.data->records[0]), "F:s.c:1 fn:g:1 fl:9:0 ");
+}
+
 TEST(Merging, HitFlagsStayFlags) {
   TempDir dir;
   const char* flags = "hitFlags 1\nrecord s.c signature=7\nfunction f line=1 calls=1\nblock 2 hits=1\nblock 3 hits=0\n";
