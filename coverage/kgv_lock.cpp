@@ -23,6 +23,7 @@ struct LockSettings {
   // Locks this process holds, by the identity of the lock directory, so that a file
   // locked for writing can be read by the same process without waiting for itself.
   struct Held {
+    std::string name;
     dev_t dev;
     ino_t ino;
     unsigned depth;
@@ -108,7 +109,7 @@ ErrorCode lockKgvFile(const std::string& path) {
       (void)!chmod(name.c_str(), 0222);
       if (made == 0) {
         struct stat mine;
-        if (lstat(name.c_str(), &mine) == 0) s.held.push_back({mine.st_dev, mine.st_ino, 1});
+        if (lstat(name.c_str(), &mine) == 0) s.held.push_back({name, mine.st_dev, mine.st_ino, 1});
         return allOK;
       }
       if (err != EEXIST) {
@@ -143,6 +144,9 @@ ErrorCode unlockKgvFile(const std::string& path) {
       s.held.erase(s.held.begin() + (h - s.held.data()));
     }
   }
+  // Whatever this process held under the name is given up, also a lock that another
+  // process broke meanwhile.
+  std::erase_if(s.held, [&](const LockSettings::Held& h) { return h.name == name; });
   if (rmdir(name.c_str()) == 0 || errno == ENOENT) return allOK;
   recordSystemError(errno, "Lock name: %s", name.c_str());
   return lockDirNotRemove;

@@ -64,6 +64,24 @@ TEST_F(Locks, TheLockIsADirectoryBesideTheFile) {
   EXPECT_EQ(unlockKgvFile(kgv), allOK);
 }
 
+TEST_F(Locks, AProcessHoldingALockCanTakeItAgainUnderAnotherName) {
+  setLockSleeper([] { ADD_FAILURE() << "waited for its own lock"; });
+  std::string other = dir.path() + "/./a.kgv";
+  ASSERT_EQ(lockKgvFile(kgv), allOK);
+  ASSERT_EQ(lockKgvFile(other), allOK);
+  EXPECT_EQ(unlockKgvFile(kgv), allOK);
+  EXPECT_TRUE(isDirectory(lock)) << "still held once";
+  EXPECT_EQ(unlockKgvFile(other), allOK);
+  EXPECT_FALSE(isDirectory(lock));
+  // Held no more: someone else's lock of the same name is waited for.
+  ASSERT_EQ(mkdir(lock.c_str(), 0777), 0);
+  int waits = 0;
+  setLockSleeper([&] { ++waits; });
+  setLockTimes(0, 3, 0);
+  EXPECT_EQ(lockKgvFile(kgv), lockWaitLong);
+  EXPECT_EQ(waits, 3);
+}
+
 TEST_F(Locks, WithLockingOffNothingIsCreated) {
   setLockingEnabled(false);
   ASSERT_EQ(mkdir(lock.c_str(), 0777), 0);  // even a busy lock does not stop the load
