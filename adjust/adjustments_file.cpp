@@ -335,6 +335,11 @@ bool writeAdjustments(FILE* stream, const char* writerName, const AdjustmentList
   for (const AdjustEntry& e : list.entries()) {
     if (!ok) break;
     if (!e.set()) continue;
+    // A name holding a tab or newline cannot be written as one field; written anyway it
+    // would split the record or forge others.
+    if (e.resolvedName().empty() || e.resolvedName().find_first_of("\t\n") != std::string::npos) {
+      continue;
+    }
     CvgAdjust lastKind = 0;
     ok = e.set()->iterateRanges([&](CvgAdjust kind, std::uint32_t first, std::uint32_t last) {
       if (kind != lastKind) {

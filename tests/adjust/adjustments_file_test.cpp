@@ -199,6 +199,19 @@ TEST_F(AdjustmentsFile, AMissingFileIsNormalAndTheFirstStoreCreatesIt) {
   EXPECT_EQ(writtenRecords(), std::vector<std::string>{a + "\t1234\tinspected\tL\t 12"});
 }
 
+TEST_F(AdjustmentsFile, ANameThatWouldBreakTheRecordFormatIsNotWritten) {
+  std::string a = src("a.c");
+  auto one = [] {
+    auto s = std::make_unique<CvgAdjustSet>();
+    s->addRange(adjLineDead, 3, 3);
+    return s;
+  };
+  adjustmentList().storeSet(one(), "/x\n/etc/passwd\t1\tdeadcode\tL\t1", 7);
+  adjustmentList().storeSet(one(), "/x\ty.c", 7);
+  adjustmentList().storeSet(one(), a, 7);
+  EXPECT_EQ(writtenRecords(), std::vector<std::string>{a + "\t7\tdeadcode\tL\t 3"});
+}
+
 TEST_F(AdjustmentsFile, TheDefaultFileLivesInTheHomeDirectory) {
   const char* oldHome = getenv("HOME");
   std::string saved = oldHome ? oldHome : "";
