@@ -25,7 +25,13 @@ const std::string kBanner = "Kestrelgauge Adjustments File 1.0\n";
 
 class AdjustmentsFile : public ::testing::Test {
  protected:
-  void SetUp() override { adjustmentList().clear(); }
+  // Every case starts from an empty list bound to its own (missing) file, never the
+  // user's real one.
+  void SetUp() override {
+    adjustmentList().clear();
+    ASSERT_TRUE(readAdjustmentsFile(path).empty());
+    ASSERT_EQ(adjustmentsFilePath(), path);
+  }
   void TearDown() override { adjustmentList().clear(); }
 
   // Writes the file and reads it; gives the warnings.
