@@ -20,7 +20,7 @@ class CvgAdjustSet {
   CvgAdjustSet() = default;
 
   // Orders the bounds and marks every line between them with the kind. False when the
-  // kind is not one of the six or a bound is beyond the largest line a set can hold.
+  // kind is not one of the six or the range holds only line 0.
   bool addRange(CvgAdjust kind, std::uint32_t first, std::uint32_t last);
   // Orders the bounds and unmarks the lines between them (as far as the set reaches).
   void removeRange(CvgAdjust kind, std::uint32_t first, std::uint32_t last);

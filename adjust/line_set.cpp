@@ -1,22 +1,14 @@
-// Bit-array line sets: word-at-a-time range updates and run iteration.
+// Line sets as sorted maximal runs: updates merge or split runs in place.
 #include "adjust/line_set.h"
 
-#include <bit>
-
-LineSet::LineSet() : capacity_(kInitialCapacity), words_(kInitialCapacity / 64, 0) {}
-
-void LineSet::grow(std::uint32_t line) {
-  std::uint32_t cap = capacity_;
-  while (line >= cap) cap *= 2;  // kMaxLine < 2^24 keeps this far from overflow
-  if (cap != capacity_) {
-    capacity_ = cap;
-    words_.resize(cap / 64, 0);
-  }
-}
+#include <algorithm>
 
 bool LineSet::test(std::uint32_t line) const {
   if (line >= capacity_) return false;
-  return (words_[line / 64] >> (line % 64)) & 1u;
+  // The last run that starts at or before the line.
+  auto it = std::upper_bound(runs_.begin(), runs_.end(), line,
+                             [](std::uint32_t l, const Run& r) { return l < r.first; });
+  return it != runs_.begin() && std::prev(it)->second >= line;
 }
 
 bool LineSet::set(std::uint32_t line) { return line != 0 && setRange(line, line); }
@@ -24,66 +16,43 @@ bool LineSet::set(std::uint32_t line) { return line != 0 && setRange(line, line)
 void LineSet::clear(std::uint32_t line) { clearRange(line, line); }
 
 bool LineSet::setRange(std::uint32_t first, std::uint32_t last) {
-  if (first > last || last > kMaxLine) return false;
   if (first == 0) first = 1;  // line 0 is never used
   if (first > last) return false;
-  grow(last);
-  std::uint32_t w1 = first / 64, w2 = last / 64;
-  std::uint64_t lowMask = ~0ull << (first % 64);
-  std::uint64_t highMask = ~0ull >> (63 - last % 64);
-  if (w1 == w2) {
-    words_[w1] |= lowMask & highMask;
-    return true;
+  while (last >= capacity_) capacity_ *= 2;
+  // Runs that overlap or touch [first, last] merge with it.
+  auto lo = std::lower_bound(runs_.begin(), runs_.end(), first, [](const Run& r, std::uint32_t f) {
+    return static_cast<std::uint64_t>(r.second) + 1 < f;
+  });
+  auto hi = lo;
+  while (hi != runs_.end() && hi->first <= static_cast<std::uint64_t>(last) + 1) ++hi;
+  if (lo != hi) {
+    first = std::min(first, lo->first);
+    last = std::max(last, std::prev(hi)->second);
+    lo = runs_.erase(lo, hi);
   }
-  words_[w1] |= lowMask;
-  for (std::uint32_t w = w1 + 1; w < w2; ++w) words_[w] = ~0ull;
-  words_[w2] |= highMask;
+  runs_.insert(lo, Run{first, last});
   return true;
 }
 
 void LineSet::clearRange(std::uint32_t first, std::uint32_t last) {
   if (first > last || first >= capacity_) return;
-  if (last >= capacity_) last = capacity_ - 1;
-  std::uint32_t w1 = first / 64, w2 = last / 64;
-  std::uint64_t lowMask = ~0ull << (first % 64);
-  std::uint64_t highMask = ~0ull >> (63 - last % 64);
-  if (w1 == w2) {
-    words_[w1] &= ~(lowMask & highMask);
-    return;
+  if (last >= capacity_) last = static_cast<std::uint32_t>(capacity_ - 1);
+  auto lo = std::lower_bound(runs_.begin(), runs_.end(), first,
+                             [](const Run& r, std::uint32_t f) { return r.second < f; });
+  std::vector<Run> keep;
+  auto hi = lo;
+  while (hi != runs_.end() && hi->first <= last) {
+    if (hi->first < first) keep.push_back({hi->first, first - 1});
+    if (hi->second > last) keep.push_back({last + 1, hi->second});
+    ++hi;
   }
-  words_[w1] &= ~lowMask;
-  for (std::uint32_t w = w1 + 1; w < w2; ++w) words_[w] = 0;
-  words_[w2] &= ~highMask;
-}
-
-bool LineSet::empty() const {
-  for (std::uint64_t w : words_) {
-    if (w) return false;
-  }
-  return true;
-}
-
-// First position at or after pos whose bit equals `value`; the capacity when there is none.
-std::uint32_t LineSet::findBit(std::uint32_t pos, bool value) const {
-  const std::uint32_t nwords = static_cast<std::uint32_t>(words_.size());
-  std::uint32_t w = pos / 64;
-  if (w >= nwords) return capacity_;
-  std::uint64_t bits = (value ? words_[w] : ~words_[w]) & (~0ull << (pos % 64));
-  while (bits == 0) {
-    if (++w >= nwords) return capacity_;
-    bits = value ? words_[w] : ~words_[w];
-  }
-  return w * 64 + static_cast<std::uint32_t>(std::countr_zero(bits));
+  lo = runs_.erase(lo, hi);
+  runs_.insert(lo, keep.begin(), keep.end());
 }
 
 bool LineSet::forEachRun(const std::function<bool(std::uint32_t, std::uint32_t)>& fn) const {
-  std::uint32_t pos = 0;
-  while (pos < capacity_) {
-    std::uint32_t first = findBit(pos, true);
-    if (first >= capacity_) break;
-    std::uint32_t end = findBit(first, false);
-    if (!fn(first, end - 1)) return false;
-    pos = end;
+  for (const Run& r : runs_) {
+    if (!fn(r.first, r.second)) return false;
   }
   return true;
 }

@@ -1,31 +1,29 @@
-// A growable set of source line numbers kept as a bit array indexed by the line number.
+// A growable set of source line numbers. It behaves as a bit array indexed by the line
+// number whose capacity starts at 2048 lines and doubles as needed, but is held as its
+// maximal runs, so that a huge line number costs no more memory than a small one.
 #pragma once
 
 #include <cstdint>
 #include <functional>
+#include <utility>
 #include <vector>
 
 class LineSet {
  public:
-  static constexpr std::uint32_t kInitialCapacity = 2048;
-  // Lines above this are refused: a set holding them would need hundreds of megabytes,
-  // and no source file has that many lines.
-  static constexpr std::uint32_t kMaxLine = (1u << 24) - 1;
-
-  LineSet();
+  static constexpr std::uint64_t kInitialCapacity = 2048;
 
   // Capacity in lines; doubles (repeatedly) when a line at or beyond it is set.
-  std::uint32_t capacity() const { return capacity_; }
+  std::uint64_t capacity() const { return capacity_; }
 
   bool test(std::uint32_t line) const;
-  // False (and nothing set) for line 0 or a line above kMaxLine.
+  // False (and nothing set) for line 0, which is never used.
   bool set(std::uint32_t line);
   void clear(std::uint32_t line);
-  // Every line from first to last inclusive (first <= last); false when last > kMaxLine.
+  // Every line from first to last inclusive; false when first > last.
   bool setRange(std::uint32_t first, std::uint32_t last);
   // Clears first..last, bounded by the capacity.
   void clearRange(std::uint32_t first, std::uint32_t last);
-  bool empty() const;
+  bool empty() const { return runs_.empty(); }
 
   // Same capacity and same contents.
   bool operator==(const LineSet& other) const = default;
@@ -35,9 +33,7 @@ class LineSet {
   bool forEachRun(const std::function<bool(std::uint32_t, std::uint32_t)>& fn) const;
 
  private:
-  void grow(std::uint32_t line);
-  std::uint32_t findBit(std::uint32_t pos, bool value) const;
-
-  std::uint32_t capacity_;
-  std::vector<std::uint64_t> words_;
+  using Run = std::pair<std::uint32_t, std::uint32_t>;  // first, last
+  std::uint64_t capacity_ = kInitialCapacity;
+  std::vector<Run> runs_;  // ascending, disjoint, never adjacent
 };

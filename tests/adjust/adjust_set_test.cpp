@@ -59,7 +59,45 @@ TEST(LineSetGrowth, CapacityDoublesFromTwoThousandLinesAndRunsSpanWords) {
   EXPECT_EQ(runs, (std::vector<std::pair<std::uint32_t, std::uint32_t>>{
                       {60, 129}, {131, 200}, {5000, 5000}}));
   EXPECT_FALSE(s.set(0));
-  EXPECT_FALSE(s.set(LineSet::kMaxLine + 1));
+}
+
+TEST(LineSetGrowth, TheLargestLineNumberCostsNoMoreThanASmallOne) {
+  LineSet s;
+  EXPECT_TRUE(s.setRange(4294967280u, 4294967289u));
+  EXPECT_EQ(s.capacity(), 4294967296ull);
+  EXPECT_TRUE(s.test(4294967289u));
+  EXPECT_FALSE(s.test(4294967290u));
+  s.clearRange(1, 4294967284u);
+  std::vector<std::pair<std::uint32_t, std::uint32_t>> runs;
+  s.forEachRun([&](std::uint32_t f, std::uint32_t l) {
+    runs.emplace_back(f, l);
+    return true;
+  });
+  EXPECT_EQ(runs, (std::vector<std::pair<std::uint32_t, std::uint32_t>>{{4294967285u, 4294967289u}}));
+}
+
+TEST(LineSetGrowth, OverlappingAndTouchingRangesMergeIntoOneRun) {
+  LineSet a, b;
+  a.setRange(10, 20);
+  a.setRange(30, 40);
+  a.setRange(21, 29);
+  a.set(5);
+  a.setRange(1, 4);
+  EXPECT_FALSE(a.setRange(9, 6));  // a line set takes its bounds in order
+  a.setRange(6, 9);
+  for (std::uint32_t l = 40; l >= 1; --l) b.set(l);
+  EXPECT_EQ(a, b);
+  b.clear(7);
+  EXPECT_FALSE(a == b);
+  EXPECT_FALSE(b.test(7));
+  EXPECT_TRUE(b.test(6));
+  EXPECT_TRUE(b.test(8));
+  // A set that grew differs from a small one with the same lines.
+  LineSet big, small;
+  big.set(5000);
+  big.clear(5000);
+  EXPECT_TRUE(big.empty());
+  EXPECT_FALSE(big == small);
 }
 
 TEST(LineSetGrowth, ARunReachingTheLastLineOfTheCapacityEndsThere) {
