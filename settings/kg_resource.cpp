@@ -11,9 +11,10 @@ const char* const kResourceProgramName = "kestrel";
 
 namespace {
 
+// Never destroyed: resource objects of static lifetime leave it during exit.
 std::vector<KG_Resource*>& registry() {
-  static std::vector<KG_Resource*> r;
-  return r;
+  static auto* r = new std::vector<KG_Resource*>;
+  return *r;
 }
 
 }  // namespace
