@@ -168,6 +168,9 @@ SettingsOutcome writeViewSettings(const std::string& path) {
   return {};
 }
 
+const char* const kDumpAllResourcesPrompt = "File for all non-OI resources?";
+const char* const kDumpEditableResourcesPrompt = "File for resources related to GUI controls?";
+
 SettingsOutcome dumpResources(const std::string& path, bool includeAll) {
   if (writeResourceFile(path, includeAll) != allOK)
     return failure(errorOccured, "dumpResourcesFailed", "Operation failed");

@@ -23,6 +23,9 @@ struct SettingsOutcome {
 SettingsOutcome writeViewSettings(const std::string& path);
 
 // "Dump all resources as..." and "Dump GUI-editable resources as...": error 3 on failure.
+// The file prompts of the two menu entries:
+extern const char* const kDumpAllResourcesPrompt;       // "File for all non-OI resources?"
+extern const char* const kDumpEditableResourcesPrompt;  // "File for resources related to GUI controls?"
 SettingsOutcome dumpResources(const std::string& path, bool includeAll);
 
 // "Update ~/.kestrel.Xdefaults": writes the GUI-editable resources to a temporary file and

@@ -7,6 +7,7 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <optional>
 
 #include "settings/settings_writer.h"
 #include "settings_test_util.h"
@@ -18,12 +19,24 @@ namespace {
 class UpdateCommand : public ::testing::Test {
  protected:
   void SetUp() override {
+    for (const char* name : {"TMPDIR", "PATH"}) {
+      const char* v = getenv(name);
+      saved.emplace_back(name, v ? std::optional<std::string>(v) : std::nullopt);
+    }
     setenv("TMPDIR", tmp.path().c_str(), 1);
     // The installation's bin/ holds the command; PATH does not.
     setenv("PATH", "/usr/bin:/bin", 1);
     settings = &kgtest::settingsFrom(none);
   }
-  void TearDown() override { clearPendingSystemError(); }
+  void TearDown() override {
+    clearPendingSystemError();
+    for (const auto& [name, v] : saved) {
+      if (v)
+        setenv(name.c_str(), v->c_str(), 1);
+      else
+        unsetenv(name.c_str());
+    }
+  }
 
   size_t leftoverTempFiles() const {
     size_t n = 0;
@@ -38,6 +51,7 @@ class UpdateCommand : public ::testing::Test {
   kgtest::TempDir tmp;
   kgtest::TextDatabase none{""};
   KG_Settings* settings = nullptr;
+  std::vector<std::pair<std::string, std::optional<std::string>>> saved;
   std::string install = kgtest::buildDir();
 };
 
@@ -147,6 +161,17 @@ TEST_F(UpdateCommand, TheCommandGetsItsArgumentsAndNoneOfTheViewersOpenFiles) {
   std::string fds = got.substr(list);
   EXPECT_EQ(fds.find("\n" + std::to_string(fd) + "\n"), std::string::npos) << fds;
   EXPECT_EQ(leftoverTempFiles(), 0u);
+}
+
+TEST_F(UpdateCommand, ATemporaryDirectoryThatIsNotThereGivesError19) {
+  setenv("TMPDIR", home.file("gone").c_str(), 1);
+  SettingsOutcome o = updateUserDefaultsFile(install, home.file(".kestrel.Xdefaults"));
+  EXPECT_EQ(o.code, writeError);
+  EXPECT_EQ(o.messageName, "noCreateTempFile");
+  EXPECT_EQ(o.context, "Unable to create temporary file");
+  EXPECT_EQ(pendingSystemError().rfind("Temp file name: " + home.file("gone") + "/kgXdf", 0), 0u)
+      << pendingSystemError();
+  EXPECT_FALSE(kgtest::fileExists(home.file(".kestrel.Xdefaults")));
 }
 
 TEST(UpdateCommandLine, PathsAreQuotedForTheShell) {
