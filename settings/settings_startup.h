@@ -7,6 +7,13 @@
 
 #include "settings/resource_database.h"
 
+// At start-up:
+//   ResourceSettingsInput in;            // installDir, language (0/1), and from the GUI the
+//   in.installDir = home;                // display's resources and -xrm lines when it has them
+//   for (auto& w : loadResourceSettings(in)) kgWarning("%s", w.c_str());
+//   ... load the data files ...
+//   if (isJava) mergeJavaResourceFiles(home);
+//   int order = sortOption given and valid ? its id : defaultSortOrder();
 struct ResourceSettingsInput : ResourceDatabaseInput {
   bool isJava = false;  // merge the Java message and label files at once
 };

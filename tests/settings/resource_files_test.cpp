@@ -169,6 +169,8 @@ TEST(ResourceFiles, FallbackLinesAreComplete) {
 }
 
 TEST(UserPaths, TildeAndEnvironmentReferencesAreExpanded) {
+  const char* oldHome = getenv("HOME");
+  std::string saved = oldHome ? oldHome : "";
   setenv("HOME", "/home/tester", 1);
   setenv("KG_TEST_DIR", "/data", 1);
   unsetenv("KG_TEST_UNSET");
@@ -179,6 +181,10 @@ TEST(UserPaths, TildeAndEnvironmentReferencesAreExpanded) {
   EXPECT_EQ(expandUserPath("a$/b${unterminated"), "a$/b${unterminated");
   EXPECT_EQ(expandUserPath("/plain/path"), "/plain/path");
   EXPECT_EQ(expandUserPath("~root/x").rfind("/", 0), 0u);
+  if (oldHome)
+    setenv("HOME", saved.c_str(), 1);
+  else
+    unsetenv("HOME");
 }
 
 TEST(UserDefaultsFile, IsCreatedFromTheTemplateWhenMissing) {
