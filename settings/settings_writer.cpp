@@ -52,6 +52,11 @@ std::string throughLinks(const std::string& path) {
 // writing fails, with the pending system error naming the path.
 ErrorCode writeResourceFile(const std::string& path, bool includeAll) {
   std::string context = "File: " + path;
+  struct stat st;
+  if (stat(path.c_str(), &st) == 0 && S_ISDIR(st.st_mode)) {
+    recordSystemError(EISDIR, "%s", context.c_str());
+    return writeError;
+  }
   AtomicFileWriter w;
   if (w.open(throughLinks(path)) != allOK) {
     renamePendingContext(context);
@@ -226,7 +231,8 @@ SettingsOutcome updateUserDefaultsFile(const std::string& installDir,
   size_t wordEnd = command.find_first_of(" \t");
   std::string word = command.substr(0, wordEnd);
   const char* path = getenv("PATH");
-  std::string searchPath = std::string(path ? path : "") + ":" + installDir + ":" + installDir + "/bin";
+  std::string searchPath = path && *path ? std::string(path) + ":" : std::string();
+  searchPath += installDir + ":" + installDir + "/bin";
   std::string found = findCommand(word, searchPath);
   SettingsOutcome o;
   if (found.empty()) {

@@ -135,6 +135,11 @@ TEST(WriteViewSettings, AFileThatCannotBeCreatedGivesError19NamingTheFile) {
   EXPECT_EQ(dialog.rfind("Unable to overwrite the file:\n ", 0), 0u);
   EXPECT_NE(dialog.find("File: "), std::string::npos);
   EXPECT_TRUE(pendingSystemError().empty());
+
+  // A directory chosen by mistake is not a file that can be overwritten.
+  EXPECT_EQ(writeViewSettings(dir.path()).code, writeError);
+  EXPECT_NE(pendingSystemError().find(strerror(EISDIR)), std::string::npos);
+  clearPendingSystemError();
 }
 
 TEST(DumpResources, AllOrOnlyTheGuiEditableOnes) {

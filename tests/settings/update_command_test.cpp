@@ -65,7 +65,8 @@ TEST_F(UpdateCommand, MergesIntoTheUsersFileKeepingTheirOtherLines) {
                     "Kestrelgauge*summaryLines: 50\n"
                     "*showCounts:   false\n"
                     "Kestrelgauge*loadingKgvDataBusyMsg: Patience,\\n\\\n please.\n"
-                    "#include \".Xresources.local\"\n");
+                    "#include \".Xresources.local\"\n"
+                    "kestrel*nameColumnWidth: \\\n   48\n");
   settings->summaryLines.setValue(64);
   settings->coverageChangesOption.set(KG_FileUpdateResource::reload);
   SettingsOutcome o = updateUserDefaultsFile(install, user);
@@ -75,7 +76,8 @@ TEST_F(UpdateCommand, MergesIntoTheUsersFileKeepingTheirOtherLines) {
   EXPECT_EQ(text.rfind("! my own settings\nXTerm*background: black\nKestrelgauge*summaryLines: 64\n"
                        "Kestrelgauge*showCounts: true\n"
                        "Kestrelgauge*loadingKgvDataBusyMsg: Patience,\\n\\\n please.\n"
-                       "#include \".Xresources.local\"\n",
+                       "#include \".Xresources.local\"\n"
+                       "Kestrelgauge*nameColumnWidth: 32\n",
                        0),
             0u)
       << text;
