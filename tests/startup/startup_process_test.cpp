@@ -190,3 +190,15 @@ TEST(FatalSignal, AbortIsReportedToo) {
   EXPECT_EQ(r.status, 1);
   EXPECT_NE(r.err.find("got signal 6 (SIGABRT - "), std::string::npos) << r.err;
 }
+
+TEST(ProductCommand, AnInstalledCopyFindsItsInstallationDirectory) {
+  kgtest::TempDir prefix;
+  auto inst = runProcess({"/usr/bin/env", "cmake", "--install", kgtest::buildDir(), "--prefix",
+                          prefix.path()});
+  ASSERT_EQ(inst.status, 0) << inst.err;
+  auto r = runProcess({prefix.file("bin/kestrel"), "-export", "-version"}, plainEnv());
+  EXPECT_EQ(r.status, 0);
+  std::string dir = prefix.path() + "/share/kestrelgauge";
+  EXPECT_NE(r.err.find("   Installed in:         " + dir + "\n"), std::string::npos) << r.err;
+  EXPECT_TRUE(kgtest::fileExists(dir + "/scripts/file-coverage"));
+}
