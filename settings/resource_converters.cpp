@@ -20,7 +20,7 @@ std::string trimmed(const std::string& s) {
   return s.substr(b, e - b + 1);
 }
 
-const char* const kSortWords[kSortOrderCount] = {
+const char* const kSortWords[kSortCriterionCount] = {
     "alpha",   "native",     "lines",   "l_used",   "l_used%",   "l_unused",
     "l_unused%", "adj_lines", "al_used", "al_used%", "al_unused", "al_unused%",
     "blocks",  "b_used",     "b_used%", "b_unused", "b_unused%",
@@ -76,19 +76,19 @@ bool convertEnumWord(const EnumWord* words, size_t count, const std::string& raw
 }
 
 const char* sortCriterionWord(int id) {
-  if (id < 1 || id > kSortOrderCount) return nullptr;
+  if (id < 1 || id > kSortCriterionCount) return nullptr;
   return kSortWords[id - 1];
 }
 
 ErrorCode sortCriterionFromWord(const std::string& word, int& id) {
   std::string s = trimmed(word);
-  for (int i = 0; i < kSortOrderCount; ++i) {
+  for (int i = 0; i < kSortCriterionCount; ++i) {
     if (strcasecmp(s.c_str(), kSortWords[i]) == 0) {
       id = i + 1;
       return allOK;
     }
   }
-  id = kDefaultSortOrder;
+  id = kDefaultSortCriterion;
   return invalidSortingOrder;
 }
 

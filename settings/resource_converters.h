@@ -22,8 +22,8 @@ extern const EnumWord kDirectoryStyleWords[2];
 extern const EnumWord kNameTruncationWords[2];
 
 // Sort criteria: ids 1..17 and their words ("alpha" ... "b_unused%").
-constexpr int kSortOrderCount = 17;
-constexpr int kDefaultSortOrder = 11;  // "al_unused"
+constexpr int kSortCriterionCount = 17;
+constexpr int kDefaultSortCriterion = 11;  // "al_unused"
 // The word of a sort order id, or nullptr outside 1..17.
 const char* sortCriterionWord(int id);
 // The id of a word; invalidSortingOrder (42) for an empty or unknown word, with id 11.

@@ -27,7 +27,7 @@ KG_Settings::KG_Settings(const ResourceSource& src)
       showCounts(src, "showCounts", true, true),
       showLineNumbers(src, "showLineNumbers", true, true),
       showToolbar(src, "showToolbar", true, true),
-      sortCriterion(src, "sortCriterion", kDefaultSortOrder, true),
+      sortCriterion(src, "sortCriterion", kDefaultSortCriterion, true),
       outlineDataColumnSeparators(src, "outlineDataColumnSeparators", KG_ColStripeResource::groups, true),
       summaryLines(src, "summaryLines", 30, 10, 100, true),
       suppressCplusplusArgumentList(src, "suppressCplusplusArgumentList", false, true),

@@ -31,7 +31,7 @@ std::vector<std::string> mergeJavaResourceFiles(const std::string& installDir) {
 
 int defaultSortOrder() {
   int v = kgSettings().sortCriterion.value;
-  return v >= 1 && v <= kSortOrderCount ? v : kDefaultSortOrder;
+  return v >= 1 && v <= kSortCriterionCount ? v : kDefaultSortCriterion;
 }
 
 bool lookupErrorText(const char* identifier, std::string& text) {

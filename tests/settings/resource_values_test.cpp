@@ -6,6 +6,7 @@
 
 #include "settings/resource_converters.h"
 #include "settings/resource_table.h"
+#include "summary/sort_orders.h"
 #include "settings_test_util.h"
 
 using kgtest::settingsFrom;
@@ -161,7 +162,7 @@ TEST(EnumeratedResources, AnUnknownSortCriterionGivesTheDefaultOrderAndError42) 
   EXPECT_EQ(sortCriterionFromWord("", id), invalidSortingOrder);
   EXPECT_EQ(id, 11);
   // Every word names its own id, and the id gives the word back.
-  for (int i = 1; i <= kSortOrderCount; ++i) {
+  for (int i = 1; i <= kSortCriterionCount; ++i) {
     ASSERT_NE(sortCriterionWord(i), nullptr);
     EXPECT_EQ(sortCriterionFromWord(sortCriterionWord(i), id), allOK);
     EXPECT_EQ(id, i);
@@ -171,6 +172,16 @@ TEST(EnumeratedResources, AnUnknownSortCriterionGivesTheDefaultOrderAndError42) 
   EXPECT_STREQ(sortCriterionWord(16), "b_unused");
   EXPECT_EQ(sortCriterionWord(0), nullptr);
   EXPECT_EQ(sortCriterionWord(18), nullptr);
+}
+
+TEST(EnumeratedResources, SortCriterionWordsAreTheNamesOfTheSortOrders) {
+  // The preference and the -sort option name the same orders by the same ids.
+  for (const SortOrderInfo& o : sortOrderTable()) {
+    ASSERT_NE(sortCriterionWord(static_cast<int>(o.id)), nullptr) << o.id;
+    EXPECT_STREQ(sortCriterionWord(static_cast<int>(o.id)), o.name);
+  }
+  EXPECT_EQ(sortOrderTable().size(), static_cast<size_t>(kSortCriterionCount));
+  EXPECT_EQ(kDefaultSortOrder, static_cast<std::uint32_t>(kDefaultSortCriterion));
 }
 
 TEST(BooleanResources, TheUsualSpellingsAreAccepted) {
