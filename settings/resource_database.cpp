@@ -2,6 +2,7 @@
 #include "settings/resource_database.h"
 
 #include <pwd.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cctype>
@@ -49,7 +50,11 @@ std::string homeDirectory(const std::string& user) {
   return pw && pw->pw_dir ? pw->pw_dir : "";
 }
 
-bool readable(const std::string& path) { return access(path.c_str(), R_OK) == 0; }
+// Only regular files: a FIFO or device named by mistake would hang or flood the start.
+bool readable(const std::string& path) {
+  struct stat st;
+  return stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode) && access(path.c_str(), R_OK) == 0;
+}
 
 }  // namespace
 

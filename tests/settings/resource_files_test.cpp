@@ -53,6 +53,15 @@ TEST(ResourceFiles, TheUsersFileBeatsTheApplicationDefaultsWhichBeatTheFallbackL
   EXPECT_EQ(getenv("OI_LIB"), inst.dir.file("UI"));
 }
 
+TEST(ResourceFiles, AUsersFileThatIsNoRegularFileIsSkipped) {
+  Installation inst;
+  std::string fifo = inst.dir.file("user");
+  ASSERT_EQ(mkfifo(fifo.c_str(), 0600), 0);
+  // Reading a pipe nobody writes to would wait for ever.
+  EXPECT_TRUE(loadResourceSettings(inst.input(fifo)).empty());
+  EXPECT_EQ(kgSettings().summaryLines.value, 30);
+}
+
 TEST(ResourceFiles, DisplayResourcesAndCommandLineLinesSitBelowTheUsersFile) {
   Installation inst;
   kgtest::writeFile(inst.dir.file("user"), "Kestrelgauge*summaryLines: 70\n");
