@@ -182,7 +182,7 @@ class KG_StrResource : public KG_Resource {
 
  protected:
   KG_StrResource(const char* name, const char* def, bool guiEditable);
-  // Writes "fullName: " then the text with newlines continued; wrap adds double quotes.
+  // Writes "fullName: " then the text with newlines continued, between double quotes if asked.
   bool writeText(FILE* stream, bool quoted) const;
   // Converts the raw string; false keeps the value.
   virtual bool convert(const ResourceSource& src, const std::string& raw, std::string& out) const;

@@ -208,8 +208,8 @@ SettingsOutcome updateUserDefaultsFile(const std::string& installDir,
     recordSystemError(errno, "Temp file name: %s", temp.c_str());
     return failure(writeError, "noCreateTempFile", "Unable to create temporary file");
   }
-  FILE* f = fdopen(fd, "w");
   errno = 0;
+  FILE* f = fdopen(fd, "w");
   bool written = f && writeAllResources(f, false);
   int err = errno ? errno : EIO;
   if (f) {
