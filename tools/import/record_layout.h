@@ -8,10 +8,10 @@
 
 #include "tools/import/coverage_import.h"
 
-constexpr std::uint16_t kCountLimit = 10000;
+constexpr std::uint16_t kImportCountLimit = 10000;
 
 inline std::uint16_t saturatedCount(std::uint64_t v) {
-  return v > kCountLimit ? kCountLimit : static_cast<std::uint16_t>(v);
+  return v > kImportCountLimit ? kImportCountLimit : static_cast<std::uint16_t>(v);
 }
 
 struct LaidOutLine {
