@@ -8,6 +8,7 @@
 #include <cstring>
 
 #include "startup/diagnostic.h"
+#include "settings/settings_startup.h"
 #include "startup/runtime_options.h"
 
 StartupState& startupState() {
@@ -138,6 +139,12 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
     ErrorCode rc = displayCheck(argc, argv);
     if (rc != allOK) return rc;
   }
+
+  // 7. The user's resource settings, before the options.
+  ResourceSettingsInput settingsInput;
+  settingsInput.installDir = home;
+  settingsInput.language = s.language;
+  for (const auto& w : loadResourceSettings(settingsInput)) kgWarning("%s", w.c_str());
 
   // 9. Load step 1: options.
   s.options = makeViewerOptionTable();
