@@ -7,7 +7,6 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstdarg>
 #include <cstdlib>
 #include <ctime>
 #include <utility>
@@ -15,6 +14,7 @@
 #include "adjust/adjustments_lock.h"
 #include "adjust/code_set.h"
 #include "adjust/src_file.h"
+#include "adjust/string_format.h"
 #include "startup/atomic_write.h"
 
 const char* const kDefaultAdjustmentsFile = "~/.kestrel.adjust";
@@ -30,19 +30,6 @@ constexpr std::uint64_t kNumberGuard = 429496728;
 std::string gPath;
 bool gWritable = true;
 
-std::string format(const char* fmt, ...) __attribute__((format(printf, 1, 2)));
-std::string format(const char* fmt, ...) {
-  va_list ap;
-  va_start(ap, fmt);
-  va_list ap2;
-  va_copy(ap2, ap);
-  int n = vsnprintf(nullptr, 0, fmt, ap);
-  va_end(ap);
-  std::string out(n > 0 ? static_cast<size_t>(n) : 0, '\0');
-  if (n > 0) vsnprintf(out.data(), out.size() + 1, fmt, ap2);
-  va_end(ap2);
-  return out;
-}
 
 std::string homeOf(const char* user) {
   if (!user || !*user) return {};
@@ -95,16 +82,16 @@ class RecordReader {
     while (end < t_.size() && t_[end] != '\t' && t_[end] != '\n') ++end;
     f.text = t_.substr(pos_, end - pos_);
     if (f.text.size() > limit) {
-      warn(format("Line %d of %s:\nthe %s is too long to be valid\n(the limit is %d characters)",
+      warn(stringPrintf("Line %d of %s:\nthe %s is too long to be valid\n(the limit is %d characters)",
                   line_, path_.c_str(), name, static_cast<int>(limit)));
       return f;
     }
     if (f.text.empty()) {
-      warn(format("Line %d of %s:\nthe %s is missing from the line", line_, path_.c_str(), name));
+      warn(stringPrintf("Line %d of %s:\nthe %s is missing from the line", line_, path_.c_str(), name));
       return f;
     }
     if (end >= t_.size() || t_[end] != '\t') {
-      warn(format("Line %d of %s:\nthe %s is not followed by a tab", line_, path_.c_str(), name));
+      warn(stringPrintf("Line %d of %s:\nthe %s is not followed by a tab", line_, path_.c_str(), name));
       return f;
     }
     pos_ = end + 1;
@@ -120,7 +107,7 @@ class RecordReader {
     std::uint64_t timeValue = 0;
     for (char c : timeField.text) {
       if (c < '0' || c > '9') {
-        warn(format("Line %d of %s:\nthe time value '%s'\ncontains non-numeric characters", line_,
+        warn(stringPrintf("Line %d of %s:\nthe time value '%s'\ncontains non-numeric characters", line_,
                     path_.c_str(), std::string(timeField.text).c_str()));
         return;
       }
@@ -132,7 +119,7 @@ class RecordReader {
     if (!kindField.ok) return;
     CvgAdjust kind = 0;
     if (!parseCvgAdjustName(kindField.text, kind)) {
-      warn(format("Line %d of %s:\n'%s' does not name\na valid kind of coverage adjustment", line_,
+      warn(stringPrintf("Line %d of %s:\n'%s' does not name\na valid kind of coverage adjustment", line_,
                   path_.c_str(), std::string(kindField.text).c_str()));
       return;
     }
@@ -141,7 +128,7 @@ class RecordReader {
     if (style.text == "B") {
       kind *= 16;
     } else if (style.text != "L") {
-      warn(format("Line %d of %s:\n'%s' does not name\na valid coverage adjustment style", line_,
+      warn(stringPrintf("Line %d of %s:\n'%s' does not name\na valid coverage adjustment style", line_,
                   path_.c_str(), std::string(style.text).c_str()));
       return;
     }
@@ -168,7 +155,7 @@ class RecordReader {
       std::string_view token = t_.substr(pos_, end - pos_);
       pos_ = end;
       if (token.size() > kRangeLimit) {
-        warn(format("Line %d of %s:\nthe line range %s...\nis too long to be valid\n(the limit is "
+        warn(stringPrintf("Line %d of %s:\nthe line range %s...\nis too long to be valid\n(the limit is "
                     "%d characters)",
                     line_, path_.c_str(), std::string(token.substr(0, kRangeLimit)).c_str(),
                     static_cast<int>(kRangeLimit)));
@@ -181,7 +168,7 @@ class RecordReader {
         valid = entry.set()->addRange(kind, first, last);
       }
       if (!valid) {
-        warn(format("Line %d of %s:\nthe text '%s' is\nnot a valid line range -- check that\nit is "
+        warn(stringPrintf("Line %d of %s:\nthe text '%s' is\nnot a valid line range -- check that\nit is "
                     "in the proper format and the\nnumbers are not too large",
                     line_, path_.c_str(), std::string(token).c_str()));
       }
@@ -219,7 +206,7 @@ class RecordReader {
 };
 
 std::string notTextWarning(const std::string& path) {
-  return format("Line 1 of %s:\nthe file is not a plain text file\n(it contains a lot of "
+  return stringPrintf("Line 1 of %s:\nthe file is not a plain text file\n(it contains a lot of "
                 "non-ASCII bytes),\nso it cannot be processed as a coverage\nadjustments file",
                 path.c_str());
 }
@@ -265,7 +252,7 @@ void parseAdjustments(std::string_view text, const std::string& path, Adjustment
     return;
   }
   if (text.substr(0, kBanner.size()) != kBanner) {
-    warnings.push_back(format("Line 1 of %s:\nthe file does not begin with the\nadjustments file "
+    warnings.push_back(stringPrintf("Line 1 of %s:\nthe file does not begin with the\nadjustments file "
                               "banner:\n   Kestrelgauge Adjustments File 1.0\nso it is not a "
                               "valid Kestrelgauge\nadjustments file.\n",
                               path.c_str()));
@@ -300,7 +287,7 @@ std::vector<std::string> readAdjustmentsFile(const std::string& givenPath) {
     }
   }
   if (rc != allOK) {
-    warnings.push_back(format("%s:\nCould not open: %s", path.c_str(), errorMessage(rc).c_str()));
+    warnings.push_back(stringPrintf("%s:\nCould not open: %s", path.c_str(), errorMessage(rc).c_str()));
     return warnings;
   }
   if (!isPlainText(fileno(f))) {

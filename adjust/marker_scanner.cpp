@@ -1,7 +1,7 @@
 // Marker grammar, range bookkeeping and the scanner's warnings.
 #include "adjust/marker_scanner.h"
 
-#include <cstdarg>
+#include "adjust/string_format.h"
 
 namespace {
 
@@ -14,19 +14,6 @@ constexpr int kCloseOrder[3] = {0, 2, 1};
 
 enum Meaning { mDead = 0, mTested = 1, mInspected = 2 };
 
-std::string format(const char* fmt, ...) __attribute__((format(printf, 1, 2)));
-std::string format(const char* fmt, ...) {
-  va_list ap;
-  va_start(ap, fmt);
-  va_list ap2;
-  va_copy(ap2, ap);
-  int n = vsnprintf(nullptr, 0, fmt, ap);
-  va_end(ap);
-  std::string out(n > 0 ? static_cast<size_t>(n) : 0, '\0');
-  if (n > 0) vsnprintf(out.data(), out.size() + 1, fmt, ap2);
-  va_end(ap2);
-  return out;
-}
 
 size_t skipBlanks(std::string_view s, size_t i) {
   while (i < s.size() && (s[i] == ' ' || s[i] == '\t')) ++i;
@@ -96,7 +83,7 @@ void MarkerScanner::oneLineMarker(int meaning, std::vector<std::string>& warning
                                   CvgAdjustSetPtr& set) {
   const int n = static_cast<int>(lineNumber_);
   if (saw_[mDead] || saw_[mTested] || saw_[mInspected]) {
-    warnings.push_back(format("Warning: line %d: 'kestrel: %s' is on\n     the same line as "
+    warnings.push_back(stringPrintf("Warning: line %d: 'kestrel: %s' is on\n     the same line as "
                               "another adjustment directive",
                               n, kMeaningName[meaning]));
   }
@@ -108,7 +95,7 @@ void MarkerScanner::beginMarker(int meaning, std::vector<std::string>& warnings)
   const int n = static_cast<int>(lineNumber_);
   for (int other : kCloseOrder) {
     if (lineStart_[other] != 0) {
-      warnings.push_back(format("Warning: line %d: 'kestrel: begin %s' overlaps\n     with "
+      warnings.push_back(stringPrintf("Warning: line %d: 'kestrel: begin %s' overlaps\n     with "
                                 "'kestrel: begin %s' from line %d",
                                 n, kMeaningName[meaning], kMeaningName[other],
                                 static_cast<int>(lineStart_[other])));
@@ -127,7 +114,7 @@ void MarkerScanner::endMarker(bool implicit, std::vector<std::string>& warnings,
   for (int m : kCloseOrder) {
     if (open_[m] == 0) continue;
     if (implicit) {
-      warnings.push_back(format("Warning: line %d: 'kestrel: begin %s' at line %d\n     has no "
+      warnings.push_back(stringPrintf("Warning: line %d: 'kestrel: begin %s' at line %d\n     has no "
                                 "matching 'kestrel: end' -- treating line %d as the end",
                                 n, kMeaningName[m], static_cast<int>(open_[m]), n));
     }
@@ -140,7 +127,7 @@ void MarkerScanner::endMarker(bool implicit, std::vector<std::string>& warnings,
   const int in = static_cast<int>(open_[mInspected]);
   if ((implicit && closed >= 2) || (!implicit && closed != 1)) {
     if (closed == 3) {
-      warnings.push_back(format("Warning: line %d: %s'kestrel: end' terminates \n"
+      warnings.push_back(stringPrintf("Warning: line %d: %s'kestrel: end' terminates \n"
                                 "         'kestrel: begin deadcode' from line %d,\n"
                                 "         'kestrel: begin inspected' from line %d,\n"
                                 "     and 'kestrel: begin tested' from line %d",
@@ -156,13 +143,13 @@ void MarkerScanner::endMarker(bool implicit, std::vector<std::string>& warnings,
       } else {
         a = "inspected", b = "tested", la = in, lb = t;
       }
-      warnings.push_back(format("Warning: line %d: %s'kestrel: end' terminates \n"
+      warnings.push_back(stringPrintf("Warning: line %d: %s'kestrel: end' terminates \n"
                                 "         'kestrel: begin %s' from line %d\n"
                                 "     and 'kestrel: begin %s' from line %d",
                                 n, prefix, a, la, b, lb));
     } else if (closed == 0) {
       warnings.push_back(
-          format("Warning: line %d: 'kestrel: end' with no matching 'kestrel: begin'", n));
+          stringPrintf("Warning: line %d: 'kestrel: end' with no matching 'kestrel: begin'", n));
     }
   }
   for (int m = 0; m < 3; ++m) open_[m] = 0;
