@@ -6,6 +6,9 @@
 
 #include <cerrno>
 
+// Detection over a sample of the file; `truncated` when the file goes on beyond it.
+static std::uint32_t detectCodeSetOfSample(std::string_view bytes, bool truncated);
+
 namespace {
 
 constexpr unsigned char kEsc = 0x1B;
@@ -50,7 +53,7 @@ bool isOddControl(unsigned c) {
 
 // Valid UTF-8 holding at least one multi-byte character. Such a file is today's ordinary
 // text and must not be taken for Shift-JIS or EUC, whose byte patterns it can resemble.
-bool isMultiByteUtf8(std::string_view s) {
+bool isMultiByteUtf8(std::string_view s, bool truncated) {
   bool multi = false;
   for (size_t i = 0; i < s.size();) {
     unsigned c = static_cast<unsigned char>(s[i]);
@@ -68,7 +71,7 @@ bool isMultiByteUtf8(std::string_view s) {
     } else {
       return false;
     }
-    if (i + len > s.size()) return false;
+    if (i + len > s.size()) return truncated && multi;  // cut off by the sample's end
     unsigned cp = c & (0xFF >> (len + 1));
     for (size_t k = 1; k < len; ++k) {
       unsigned t = static_cast<unsigned char>(s[i + k]);
@@ -105,7 +108,9 @@ bool isPlainText(int fd) {
   return isPlainTextBytes(head);
 }
 
-std::uint32_t detectCodeSetOfBytes(std::string_view b) {
+std::uint32_t detectCodeSetOfBytes(std::string_view b) { return detectCodeSetOfSample(b, false); }
+
+static std::uint32_t detectCodeSetOfSample(std::string_view b, bool truncated) {
   // The text test that comes first: no NUL and few odd control bytes near the start;
   // bytes with the high bit set are the multi-byte text this test must let through.
   std::string_view head = b.substr(0, 512);
@@ -115,7 +120,7 @@ std::uint32_t detectCodeSetOfBytes(std::string_view b) {
     if (isOddControl(c)) ++odd;
   }
   if (!head.empty() && head.size() <= 10 * odd) return codeSetNotText;
-  if (isMultiByteUtf8(b)) return codeSetPlain;
+  if (isMultiByteUtf8(b, truncated)) return codeSetPlain;
 
   std::uint32_t result = codeSetPlain;
   const size_t n = b.size();
@@ -179,9 +184,13 @@ std::uint32_t detectCodeSetOfBytes(std::string_view b) {
 
 std::uint32_t detectCodeSet(int fd) {
   if (!isRegular(fd)) return codeSetNotText;
-  std::string all;
-  if (!readHead(fd, all, static_cast<size_t>(-1) / 2)) return codeSetNotText;
-  return detectCodeSetOfBytes(all);
+  // A sample of the first 64 MiB decides for any larger file, keeping memory bounded.
+  constexpr size_t kSample = size_t{64} << 20;
+  std::string sample;
+  if (!readHead(fd, sample, kSample + 1)) return codeSetNotText;
+  bool truncated = sample.size() > kSample;
+  if (truncated) sample.resize(kSample);
+  return detectCodeSetOfSample(sample, truncated);
 }
 
 bool shiftJisToEuc(std::string_view in, std::string& out) {
