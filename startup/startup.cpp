@@ -10,6 +10,7 @@
 #include "startup/diagnostic.h"
 #include "settings/settings_startup.h"
 #include "startup/runtime_options.h"
+#include "startup/settings_wiring.h"
 
 StartupState& startupState() {
   static StartupState s;
@@ -145,6 +146,7 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
   settingsInput.installDir = home;
   settingsInput.language = s.language;
   for (const auto& w : loadResourceSettings(settingsInput)) kgWarning("%s", w.c_str());
+  wireSettingsIntoEngine();
 
   // 9. Load step 1: options.
   s.options = makeViewerOptionTable();
