@@ -34,8 +34,13 @@ class QR_FamilyObject : public QR_ActionObject {
   QR_FamilyObject* next_sibling() const;
   QR_FamilyObject* previous_sibling() const;
   bool is_ancestor_of(const QR_FamilyObject* other) const;
+  bool is_outline_row() const { return is_outline_row_; }
 
  protected:
+  // Set by outline rows for as long as they are whole, so that rows recognise each other in
+  // their tree walks without a run-time type check per step.
+  bool is_outline_row_ = false;
+
   // Destroys every child; used by destructors of derived classes that must
   // see their children go while they are still whole.
   void destroy_children();

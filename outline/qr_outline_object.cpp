@@ -4,16 +4,25 @@
 #include "outline/qr_outline_actions.h"
 #include "outline/qr_outline_root.h"
 
-QR_OutlineObject::QR_OutlineObject() { (void)QR_outlineTables(); }
+QR_OutlineObject::QR_OutlineObject() {
+  (void)QR_outlineTables();
+  is_outline_row_ = true;
+}
 
 QR_OutlineObject::~QR_OutlineObject() {
   // Leaving the outline while still a whole row lets the lines go from the display at once.
   if (parent() != nullptr) parent()->remove_child(this);
   destroy_children();
+  is_outline_row_ = false;
+}
+
+QR_OutlineObject* QR_OutlineObject::as_row(QR_FamilyObject* object) {
+  return (object != nullptr && object->is_outline_row()) ? static_cast<QR_OutlineObject*>(object) : nullptr;
 }
 
 QR_OutlineRoot* QR_OutlineObject::root() {
-  return dynamic_cast<QR_OutlineRoot*>(find_root());
+  QR_OutlineObject* top = as_row(find_root());
+  return (top != nullptr && top->is_root()) ? static_cast<QR_OutlineRoot*>(top) : nullptr;
 }
 
 QR_OutlineDisplay* QR_OutlineObject::display() {
@@ -21,7 +30,7 @@ QR_OutlineDisplay* QR_OutlineObject::display() {
   return (r != nullptr && !r->tearing_down_) ? r->display_ : nullptr;
 }
 
-QR_OutlineObject* QR_OutlineObject::parent_row() const { return dynamic_cast<QR_OutlineObject*>(parent()); }
+QR_OutlineObject* QR_OutlineObject::parent_row() const { return as_row(parent()); }
 
 QR_OutlineObject* QR_OutlineObject::child_row(std::uint32_t index) const {
   return static_cast<QR_OutlineObject*>(child(index));
@@ -72,7 +81,7 @@ bool QR_OutlineObject::is_displayed() {
   for (;;) {
     QR_FamilyObject* p = r->parent();
     if (p == nullptr) return r->is_root();
-    QR_OutlineObject* pr = dynamic_cast<QR_OutlineObject*>(p);
+    QR_OutlineObject* pr = as_row(p);
     if (pr == nullptr || !pr->is_expanded()) return false;
     r = pr;
   }
@@ -330,7 +339,7 @@ void QR_OutlineObject::detaching_from_parent(QR_FamilyObject*) {
 }
 
 void QR_OutlineObject::child_added(QR_FamilyObject* child) {
-  QR_OutlineObject* c = dynamic_cast<QR_OutlineObject*>(child);
+  QR_OutlineObject* c = as_row(child);
   if (c == nullptr) {
     // Only rows can be rows' children.
     remove_child(child);
@@ -370,7 +379,7 @@ void QR_OutlineObject::child_added(QR_FamilyObject* child) {
 }
 
 void QR_OutlineObject::child_removed(QR_FamilyObject* child) {
-  QR_OutlineObject* c = dynamic_cast<QR_OutlineObject*>(child);
+  QR_OutlineObject* c = as_row(child);
   if (c == nullptr) return;
   if (c->is_expanded() && expanded_children_ > 0) --expanded_children_;
   QR_OutlineRoot* r = root();

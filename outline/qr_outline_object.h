@@ -109,6 +109,9 @@ class QR_OutlineObject : public QR_FamilyObject {
  private:
   friend class QR_OutlineRoot;
 
+  // The object as a row, null when it is not one.
+  static QR_OutlineObject* as_row(QR_FamilyObject* object);
+
   void set_expanded(bool on);
   void notify_row_changed();
 

@@ -151,7 +151,8 @@ void QR_OutlineRoot::insert_into_selection(QR_OutlineObject* row) {
 
 void QR_OutlineRoot::select_exclusively(QR_OutlineObject* row) {
   if (tearing_down_) return;
-  if (row != nullptr && (row == this || row->root() != this)) return;
+  // Only rows on the display can be selected: rows leave the selection when they leave it.
+  if (row != nullptr && (row == this || row->root() != this || !row->is_displayed())) return;
   const std::vector<QR_OutlineObject*> old = selection_.items();
   selection_.clear();
   for (QR_OutlineObject* s : old) {
@@ -169,6 +170,7 @@ void QR_OutlineRoot::select_exclusively(QR_OutlineObject* row) {
 
 void QR_OutlineRoot::add_to_selection(QR_OutlineObject* row) {
   if (tearing_down_ || row == nullptr || row == this || row->is_selected() || row->root() != this) return;
+  if (!row->is_selectable() || !row->is_displayed()) return;
   insert_into_selection(row);
   row->flags_ |= kSelected;
   display_->row_selected(row);

@@ -37,11 +37,12 @@ class QR_OutlineRoot : public QR_OutlineObject {
   // The selection, in ascending line order.
   std::uint32_t selection_count() const { return selection_.count(); }
   QR_OutlineObject* selected(std::uint32_t index) const { return selection_.at(index); }
-  // Selects the row alone; null only clears the selection. Rows of other outlines are refused.
+  // Selects the row alone; null only clears the selection. Rows of other outlines and rows
+  // that are not displayed are refused.
   void select_exclusively(QR_OutlineObject* row);
   void clear_selection() { select_exclusively(nullptr); }
-  // Adds a row to the selection, keeping line order (a display rebuilding the selection from a
-  // dragged range uses it).
+  // Adds a selectable, displayed row to the selection, keeping line order (a display rebuilding
+  // the selection from a dragged range uses it).
   void add_to_selection(QR_OutlineObject* row);
   // Takes a selected row out of the selection.
   void deselect(QR_OutlineObject* row);
