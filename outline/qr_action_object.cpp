@@ -56,13 +56,13 @@ const QR_CompiledActions::Entry* QR_ActionObject::find_entry(XrmQuark atom) cons
   return nullptr;
 }
 
-bool QR_ActionObject::perform_one(std::string_view name, void* argument) {
+bool QR_ActionObject::perform_one(std::string_view name, void* argument, const QR_ObjectWatch& self) {
   const QR_CompiledActions::Entry* entry = find_entry(QR_ActionAtom(name));
   if (entry == nullptr) return false;
   std::string text(name);
   before_action(text.c_str());
   entry->operation(*this, argument);
-  after_action(text.c_str());
+  if (!self.gone(this)) after_action(text.c_str());
   return true;
 }
 
@@ -71,8 +71,11 @@ bool QR_ActionObject::perform_action(const char* names, void* argument) {
   bool performed = false;
   // The names are copied first: an action may change what the caller's string points at.
   std::string copy(names);
+  QR_ObjectWatch self;
+  self.watch(this);
   for (std::string_view name : QR_SplitActionNames(copy)) {
-    if (perform_one(name, argument)) performed = true;
+    if (perform_one(name, argument, self)) performed = true;
+    if (self.gone(this)) break;
   }
   return performed;
 }

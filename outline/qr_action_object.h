@@ -77,8 +77,9 @@ class QR_ActionObject : public QR_Object {
   const QR_PointerArray<QR_CompiledActions>* action_tables() const { return tables_.get(); }
 
  protected:
-  // One name: searched in the attached tables in attachment order.
-  bool perform_one(std::string_view name, void* argument);
+  // One name: searched in the attached tables in attachment order. The watch tells whether the
+  // action destroyed this object, in which case nothing more is done with it.
+  bool perform_one(std::string_view name, void* argument, const QR_ObjectWatch& self);
 
  private:
   const QR_CompiledActions::Entry* find_entry(XrmQuark atom) const;

@@ -40,3 +40,21 @@ void QR_Object::add_link(QR_Object* other) {
 void QR_Object::drop_link(QR_Object* other) {
   if (links_) links_->remove(other);
 }
+
+QR_ObjectWatch::QR_ObjectWatch() = default;
+
+QR_ObjectWatch::~QR_ObjectWatch() {
+  while (const QR_PointerArray<QR_Object>* links = linked_objects()) {
+    if (links->empty()) break;
+    unlink(links->last());
+  }
+}
+
+bool QR_ObjectWatch::gone(const QR_Object* object) const {
+  for (const QR_Object* g : gone_) {
+    if (g == object) return true;
+  }
+  return false;
+}
+
+void QR_ObjectWatch::linked_object_destroyed(QR_Object* gone) { gone_.push_back(gone); }

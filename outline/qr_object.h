@@ -2,6 +2,7 @@
 #pragma once
 
 #include <memory>
+#include <vector>
 
 template <class T>
 class QR_PointerArray;
@@ -28,4 +29,20 @@ class QR_Object {
   void drop_link(QR_Object* other);
 
   std::unique_ptr<QR_PointerArray<QR_Object>> links_;  // created on first use
+};
+
+// Notes which of the objects it watches are destroyed while it watches them, so that code which
+// runs client actions on several objects never touches one an earlier action destroyed.
+class QR_ObjectWatch : public QR_Object {
+ public:
+  QR_ObjectWatch();
+  // Survivors are let go quietly: they hear nothing of the watch's end.
+  ~QR_ObjectWatch() override;
+
+  void watch(QR_Object* object) { link(object); }
+  bool gone(const QR_Object* object) const;
+  void linked_object_destroyed(QR_Object* gone) override;
+
+ private:
+  std::vector<const QR_Object*> gone_;
 };

@@ -62,9 +62,13 @@ bool QR_OutlineRoot::perform_action(const char* names, void* argument) {
     const std::size_t count = single ? 1 : rows.size();
     const bool forwards = n == QR_OutlineExpand || n == QR_OutlineExpandGlyph || n == QR_OutlineExpandAll ||
                           n == QR_OutlinePrevious || (n == QR_OutlineExpandCollapse && !rows.front()->is_expanded());
+    // A client action may destroy rows; those are passed over.
+    QR_ObjectWatch watch;
+    for (QR_OutlineObject* row : rows) watch.watch(row);
     display_->begin_action(names);
     for (std::size_t i = 0; i < count; ++i) {
       QR_OutlineObject* row = forwards ? rows[i] : rows[rows.size() - 1 - i];
+      if (watch.gone(row)) continue;
       result = row->perform_action(names, argument);
     }
     display_->end_action(names);

@@ -136,6 +136,42 @@ TEST(ActionStrings, ClientTablesTakePartLikeTheLibrarysOwn) {
   EXPECT_EQ(row->opened, 1);
 }
 
+namespace {
+
+// A row whose action clears its whole group, itself included, as a "remove these" command might.
+struct GroupRow : QR_OutlineText {
+  explicit GroupRow(const char* t) : QR_OutlineText(t) {}
+  void clear_group() {
+    QR_FamilyObject* group = parent();
+    while (group->child_count() > 0) delete group->child(0);
+  }
+};
+
+}  // namespace
+
+TEST(ActionStrings, RowsDestroyedByAnEarlierActionArePassedOver) {
+  static const QR_ActionSpec specs[] = {{"KG_ClearGroup", &QR_ActionCall<GroupRow, &GroupRow::clear_group>}};
+  static QR_CompiledActions table(specs, 1);
+  Outline o;
+  QR_OutlineText* group = o.add(o.root.get(), "group", true);
+  for (const char* n : {"one", "two", "three"}) {
+    auto* r = new GroupRow(n);
+    r->make_selectable();
+    r->attach_actions(&table);
+    group->add_child(r);
+  }
+  QR_OutlineText* after = o.add(o.root.get(), "after");
+  group->expand();
+  o.root->select_exclusively(group->child_row(0));
+  o.root->add_to_selection(group->child_row(2));
+  EXPECT_TRUE(o.act("KG_ClearGroup,QR_OutlineMakeVisible"));
+  EXPECT_EQ(group->child_count(), 0u);
+  EXPECT_EQ(o.root->selection_count(), 0u);
+  EXPECT_EQ(o.screen(), (Lines{"v  group", "   after"}));
+  EXPECT_EQ(after->first_line(), 1u);
+  expectConsistent(o);
+}
+
 TEST(Annotations, OnePerPlaceAndTheDisplayHearsOfEachChange) {
   Outline o;
   QR_OutlineText* row = o.add(o.root.get(), "row");
