@@ -22,7 +22,7 @@ QR_OutlineObject* QR_OutlineObject::as_row(QR_FamilyObject* object) {
 
 QR_OutlineRoot* QR_OutlineObject::root() {
   QR_OutlineObject* top = as_row(find_root());
-  return (top != nullptr && top->is_root()) ? static_cast<QR_OutlineRoot*>(top) : nullptr;
+  return (top != nullptr && top->is_outline_root_) ? static_cast<QR_OutlineRoot*>(top) : nullptr;
 }
 
 QR_OutlineDisplay* QR_OutlineObject::display() {

@@ -123,4 +123,6 @@ class QR_OutlineObject : public QR_FamilyObject {
   // How many children are expanded, so that the root answers "is any top-level row
   // expanded" without looking at every row.
   std::uint32_t expanded_children_ = 0;
+  // Set while the object is a whole QR_OutlineRoot: rows find their root without a type check.
+  bool is_outline_root_ = false;
 };

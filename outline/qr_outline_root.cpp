@@ -21,6 +21,7 @@ class QR_NullDisplay : public QR_OutlineDisplay {
 
 QR_OutlineRoot::QR_OutlineRoot(QR_OutlineDisplay* display)
     : display_(display != nullptr ? display : new QR_NullDisplay) {
+  is_outline_root_ = true;
   attach_actions(QR_outlineTables().collapse_children);
   first_line_ = 0;
   display_->set_root(this);
@@ -35,6 +36,7 @@ QR_OutlineRoot::~QR_OutlineRoot() {
   destroy_children();
   delete display_;
   display_ = nullptr;
+  is_outline_root_ = false;
 }
 
 bool QR_OutlineRoot::is_root() { return true; }

@@ -217,3 +217,21 @@ TEST(Family, ATreeCannotBeMadeIntoALoopAndAMovedRowLeavesItsOldParent) {
   EXPECT_EQ(b->depth(), 0u);
   expectConsistent(o);
 }
+
+TEST(Family, AnOutlineWithoutADisplayStillNumbersItsRowsAndMovesTheSelection) {
+  QR_OutlineRoot root(nullptr);
+  auto* dir = new QR_OutlineText("dir");
+  dir->make_expandable();
+  for (const char* n : {"a", "b"}) {
+    auto* f = new QR_OutlineText(n);
+    f->make_selectable();
+    dir->add_child(f);
+  }
+  root.add_child(dir);
+  dir->select();
+  EXPECT_TRUE(root.perform_action("QR_OutlineExpand", nullptr));
+  EXPECT_EQ(root.total_lines(), 3u);
+  EXPECT_EQ(root.object_at_line(2), dir->child_row(1));
+  root.perform_action(QR_OutlineLast, nullptr);
+  EXPECT_EQ(root.selected(0), dir->child_row(1));
+}
