@@ -8,6 +8,7 @@
 #include <cstring>
 
 #include "startup/diagnostic.h"
+#include "settings/settings_startup.h"
 #include "startup/runtime_options.h"
 
 StartupState& startupState() {
@@ -86,6 +87,30 @@ const char* languageArgument(int argc, char** argv) {
 
 }  // namespace
 
+std::vector<KgvFileRef> buildFileList(const std::vector<std::string>& fileArgs) {
+  std::vector<KgvFileRef> list;
+  std::vector<int> positions;  // 1-based position among the FILE arguments of each entry
+  for (size_t i = 0; i < fileArgs.size(); ++i) {
+    KgvFileRef ref = makeKgvFileRef(fileArgs[i]);
+    int found = findKgvFileRef(list, ref.resolvedName);
+    if (found < 0) {
+      list.push_back(std::move(ref));
+      positions.push_back(static_cast<int>(i) + 1);
+      continue;
+    }
+    const KgvFileRef& earlier = list[static_cast<size_t>(found)];
+    bool showResolved = earlier.givenName != earlier.resolvedName &&
+                        ref.givenName != ref.resolvedName && earlier.givenName != ref.givenName;
+    reportError(duplicateFile,
+                "The filename arguments %s\n(#%d among the names) and %s\n(#%d among the names) "
+                "both refer to the same file%s%s%s.\nIt will be loaded only once.\n",
+                earlier.givenName.c_str(), positions[static_cast<size_t>(found)],
+                ref.givenName.c_str(), static_cast<int>(i) + 1, showResolved ? "\n(" : "",
+                showResolved ? ref.resolvedName.c_str() : "", showResolved ? ")" : "");
+  }
+  return list;
+}
+
 ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
   StartupState& s = startupState();
 
@@ -114,6 +139,12 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
     ErrorCode rc = displayCheck(argc, argv);
     if (rc != allOK) return rc;
   }
+
+  // 7. The user's resource settings, before the options.
+  ResourceSettingsInput settingsInput;
+  settingsInput.installDir = home;
+  settingsInput.language = s.language;
+  for (const auto& w : loadResourceSettings(settingsInput)) kgWarning("%s", w.c_str());
 
   // 9. Load step 1: options.
   s.options = makeViewerOptionTable();
@@ -155,6 +186,9 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
 
   // Load step 7: merge mode.
   s.mergeMode = getBoolViewerOption("forcemerge", s.options, false, true) ? 2 : 1;
+
+  // Load step 8: the list of distinct files.
+  s.loadedFiles = buildFileList(s.fileArgs);
 
   // The loading of data comes with the data engine.
   reportError(notImplemented, "%s", errorMessage(notImplemented).c_str());

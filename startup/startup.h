@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "adjust/errors.h"
+#include "coverage/kgv_file_ref.h"
 #include "startup/viewer_options.h"
 
 enum class RunMode { view, exportReport, merge, extract };
@@ -22,7 +23,13 @@ struct StartupState {
   std::uint32_t mergeMode = 1;
   std::vector<ViewerOption> options;
   std::vector<std::string> fileArgs;  // FILE arguments in command-line order
+  std::vector<KgvFileRef> loadedFiles;  // one per distinct data file, in command-line order
+  bool isJava = false;
 };
+
+// Load step 8: one reference per distinct file; a second name for the same file is
+// reported with the duplicate notice and dropped.
+std::vector<KgvFileRef> buildFileList(const std::vector<std::string>& fileArgs);
 
 StartupState& startupState();
 

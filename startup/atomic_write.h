@@ -1,0 +1,35 @@
+// Writing a user's file safely: a new file beside the target, renamed over it only when
+// everything was written, so a failure never destroys what was there.
+#pragma once
+
+#include <cstdio>
+#include <string>
+
+#include "adjust/errors.h"
+
+class AtomicFileWriter {
+ public:
+  AtomicFileWriter() = default;
+  ~AtomicFileWriter();
+  AtomicFileWriter(const AtomicFileWriter&) = delete;
+  AtomicFileWriter& operator=(const AtomicFileWriter&) = delete;
+
+  // Creates the temporary file in the target's directory. An existing target's permission
+  // bits are kept; a new file gets 0666 less the umask. Failure: writeError (19), with the
+  // system error recorded.
+  ErrorCode open(const std::string& target);
+  FILE* stream() const { return stream_; }
+  const std::string& target() const { return target_; }
+  const std::string& temporaryPath() const { return temp_; }
+
+  // Flushes, syncs, closes and renames over the target. Any failure removes the temporary
+  // file, leaves the target untouched and gives fileWriteFailed (21) with the system error.
+  ErrorCode commit();
+  // Drops the temporary file; the target stays as it was.
+  void abandon();
+
+ private:
+  std::string target_;
+  std::string temp_;
+  FILE* stream_ = nullptr;
+};
