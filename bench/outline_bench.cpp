@@ -90,9 +90,9 @@ void BM_ExpandLastDirectory(benchmark::State& state) {
 
 }  // namespace
 
-BENCHMARK(BM_ExpandAll)->Arg(10000)->Arg(100000)->Unit(benchmark::kMillisecond)->Complexity(benchmark::oN);
-BENCHMARK(BM_CollapseAll)->Arg(10000)->Arg(100000)->Unit(benchmark::kMillisecond)->Complexity(benchmark::oN);
-BENCHMARK(BM_NextThroughEveryRow)->Arg(10000)->Arg(100000)->Unit(benchmark::kMillisecond)->Complexity(benchmark::oN);
-BENCHMARK(BM_ExpandLastDirectory)->Arg(10000)->Arg(100000)->Unit(benchmark::kMicrosecond)->Complexity(benchmark::oN);
+BENCHMARK(BM_ExpandAll)->Arg(10000)->Arg(100000)->Arg(300000)->Unit(benchmark::kMillisecond)->Complexity(benchmark::oN);
+BENCHMARK(BM_CollapseAll)->Arg(10000)->Arg(100000)->Arg(300000)->Unit(benchmark::kMillisecond)->Complexity(benchmark::oN);
+BENCHMARK(BM_NextThroughEveryRow)->Arg(10000)->Arg(100000)->Arg(300000)->Unit(benchmark::kMillisecond)->Complexity(benchmark::oN);
+BENCHMARK(BM_ExpandLastDirectory)->Arg(10000)->Arg(100000)->Arg(300000)->Unit(benchmark::kMicrosecond)->Complexity(benchmark::oN);
 
 BENCHMARK_MAIN();
