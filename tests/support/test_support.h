@@ -36,6 +36,20 @@ ProcessResult runProcess(const std::vector<std::string>& argv,
                          const std::vector<std::string>& env = {}, const std::string& input = {},
                          const std::string& cwd = {});
 
+// A private X server on a free display, for tests that need one; never the user's display.
+class XvfbServer {
+ public:
+  XvfbServer();   // starts Xvfb -displayfd; display() is empty when it could not start
+  ~XvfbServer();  // stops it
+  XvfbServer(const XvfbServer&) = delete;
+  XvfbServer& operator=(const XvfbServer&) = delete;
+  const std::string& display() const { return display_; }
+
+ private:
+  int pid_ = -1;
+  std::string display_;
+};
+
 // Paths in the build tree.
 std::string buildDir();
 std::string sourceDir();

@@ -1,0 +1,30 @@
+// The seventeen sort orders: ids, names, menu labels, and the sort menu's cells.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "adjust/errors.h"
+
+struct SortOrderInfo {
+  std::uint32_t id;
+  const char* name;       // used in preferences, options and menu cells
+  const char* menuLabel;  // shown in the sort menu and the name column heading
+};
+
+constexpr std::uint32_t kDefaultSortOrder = 11;  // "al_unused"
+
+// The orders by id (1..17).
+const std::vector<SortOrderInfo>& sortOrderTable();
+// The name table in its own sequence, ending with the empty 18th row.
+const std::vector<SortOrderInfo>& sortOrderNameTable();
+
+// Name of an order, or "" for an unknown id.
+const char* sort_order_name(std::uint32_t id);
+const char* sort_order_label(std::uint32_t id);
+// Exact, case-sensitive name; empty or unknown: invalidSortingOrder with id 11.
+ErrorCode sort_order_by_name(const char* name, std::uint32_t& id);
+
+// The cells of the sort menu "kgSort" in order; an empty name stands for a separator.
+const std::vector<const char*>& sortMenuCells();
