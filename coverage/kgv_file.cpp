@@ -91,13 +91,15 @@ ErrorCode checkRecord(const unsigned char* rec, size_t size, bool swapped, KgvRe
   if (static_cast<std::int64_t>(fileOff) > lastNul) return corruptKgvFile;
   if (r.strings[fileOff] == '\0') return filenameEmpty;
   r.fileNameOffset = fileOff;
+  // The largest name offset of the map decides; a pass without early exit runs fast.
+  std::uint32_t largest = 0;
   for (size_t i = 0; i < n; ++i) {
-    std::uint32_t e = entry(i);
-    std::uint32_t tag = mapTag(e);
-    if ((tag == TagFile || tag == TagFunction) &&
-        static_cast<std::int64_t>(mapValue(e)) > lastNul)
-      return corruptKgvFile;
+    std::uint32_t e = swapped ? bswap32(r.map[i]) : r.map[i];
+    std::uint32_t tag = e >> 28;
+    std::uint32_t named = (tag == TagFile || tag == TagFunction) ? mapValue(e) : 0;
+    largest = std::max(largest, named);
   }
+  if (static_cast<std::int64_t>(largest) > lastNul) return corruptKgvFile;
   return allOK;
 }
 
