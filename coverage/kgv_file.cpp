@@ -292,7 +292,9 @@ ErrorCode writeKgvFile(const std::string& path, KgvData& data) {
   // The index comes first in the file, so every record's size is settled before writing.
   data.recordSizes.resize(data.records.size(), 0);
   for (size_t i = 0; i < data.records.size(); ++i) {
-    const ObjRecord& r = *data.records[i];
+    ObjRecord& r = *data.records[i];
+    while (r.strings.size() % 4) r.strings.push_back('\0');  // the area is whole words
+    if (r.counts.size() != r.map.size()) r.counts.resize(r.map.size(), 0);
     std::uint32_t built = recordWords(r);
     if (!r.fromFile || data.recordSizes[i] < built) data.recordSizes[i] = built;
   }
