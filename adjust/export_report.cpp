@@ -1,0 +1,222 @@
+// Writing the export report through one buffered, guarded writer: after the first failed
+// write nothing more is written, and a closed pipe counts as success.
+#include "adjust/export_report.h"
+
+#include <cerrno>
+#include <charconv>
+#include <cstring>
+
+#include "startup/atomic_write.h"
+
+namespace {
+
+constexpr std::uint32_t kSaturation = 10000;
+
+const char* const kKeyLines[] = {
+    "",
+    " Summary of keys and field meanings:",
+    "",
+    " to unused-blocks blocks unused-lines lines unused-funcs funcs files dirs",
+    " di name unused-blocks blocks unused-lines lines unused-funcs funcs files",
+    " fi name unused-blocks blocks unused-lines lines unused-funcs funcs sessions",
+    " fu name unused-blocks blocks unused-lines lines calls",
+    " li line_no hits",
+    " bl line_no hits",
+    " efu name",
+    " efi name",
+    " edi name",
+    "",
+    " In all of these entries, the character separating the values is a TAB, not",
+    " a space.",
+    "",
+    " Values for hits, calls, and sessions stop accumulating once they reach",
+    nullptr,  // the line with the three limits
+    "",
+    " 'to'  -- Total coverage summary.",
+    " 'di'  -- Coverage summary for one directory, followed by the files in the",
+    "          directory.  Repeated for each directory.",
+    " 'edi' -- End of information for named directory.",
+    " 'fi'  -- Coverage summary for one file, followed by the functions in the",
+    "          file.  Repeated for each file within a directory.",
+    " 'efi' -- End of information for named file.",
+    " 'fu'  -- Coverage summary for one function, followed by line and block",
+    "          coverage information for the function.  Repeated for each function",
+    "          within the file.",
+    " 'efu' -- End of information for named function.",
+    " 'li'  -- Use count for the indicated line.  Repeated for each line in the",
+    "          function.  If coverage adjustments are NOT applied, then the",
+    "          hits figure is the true hits figure for the line.  If coverage",
+    "          adjustments ARE applied, then inspected and tested lines will",
+    "          indicate INSP or TEST as appropriate, while other used and unused",
+    "          lines will indicate their counts.  Deadcode lines do not appear",
+    "          in export format when adjustments are applied.",
+    " 'bl'  -- Use count for the basic block.  Repeated for each block in the",
+    "          function.  Note that a single line may contain multiple blocks,",
+    "          and that a single block may span multiple lines.",
+};
+
+std::uint32_t saturate(std::uint32_t v) { return v > kSaturation ? kSaturation : v; }
+
+// Collects output in a buffer and hands it to the stream in large writes. The first failed
+// write sets the flag; everything after it is dropped.
+class GuardedWriter {
+ public:
+  explicit GuardedWriter(FILE* stream) : stream_(stream) {
+    errno = 0;
+    buf_.reserve(kChunk + 4096);
+  }
+
+  GuardedWriter& text(std::string_view s) {
+    buf_.append(s);
+    return *this;
+  }
+  GuardedWriter& tab() {
+    buf_.push_back('\t');
+    return *this;
+  }
+  GuardedWriter& number(std::uint32_t v) {
+    char digits[16];
+    auto res = std::to_chars(digits, digits + sizeof digits, v);
+    buf_.append(digits, static_cast<std::size_t>(res.ptr - digits));
+    return *this;
+  }
+  // Ends a line; the buffer goes out once it is large.
+  void endLine() {
+    buf_.push_back('\n');
+    if (buf_.size() >= kChunk) flush();
+  }
+
+  void flush() {
+    if (!failed_ && !buf_.empty()) {
+      std::size_t n = std::fwrite(buf_.data(), 1, buf_.size(), stream_);
+      if (n != buf_.size() || std::fflush(stream_) != 0) fail();
+    }
+    buf_.clear();
+  }
+
+  ErrorCode finish() {
+    flush();
+    if (!failed_) return allOK;
+    if (savedErrno_ == EPIPE) {
+      clearPendingSystemError();
+      return allOK;
+    }
+    return fileWriteFailed;
+  }
+
+  bool failed() const { return failed_; }
+
+ private:
+  static constexpr std::size_t kChunk = 1 << 16;
+
+  void fail() {
+    failed_ = true;
+    savedErrno_ = errno != 0 ? errno : EIO;
+    recordSystemError(savedErrno_);
+  }
+
+  FILE* stream_;
+  std::string buf_;
+  bool failed_ = false;
+  int savedErrno_ = 0;
+};
+
+void writeHeader(GuardedWriter& w, std::time_t when) {
+  std::string hashes(79, '#');
+  w.text(hashes).endLine();
+  char date[64] = "";
+  struct tm local {};
+  if (localtime_r(&when, &local)) strftime(date, sizeof date, "%d-%h-%Y %r", &local);
+  char line[160];
+  snprintf(line, sizeof line, "# This is a Kestrelgauge export file, created %-31s #", date);
+  w.text(line).endLine();
+  snprintf(line, sizeof line, "# Coverage data type: %-55s #", "adjusted.");
+  w.text(line).endLine();
+  for (const char* key : kKeyLines) {
+    char limits[96];
+    if (!key) {
+      snprintf(limits, sizeof limits, " %5d, so a value of %5d should be taken as %5d or greater.",
+               int(kSaturation), int(kSaturation), int(kSaturation));
+      key = limits;
+    }
+    snprintf(line, sizeof line, "#%-77s#", key);
+    w.text(line).endLine();
+  }
+  w.text(hashes).endLine();
+}
+
+void writeFunction(GuardedWriter& w, const SumFile& file, const SumFunc& fn) {
+  w.text("fu\t").text(fn.name).tab().number(fn.counts.unusedBlocks).tab().number(fn.counts.blocks);
+  w.tab().number(fn.counts.adjUnusedLines).tab().number(fn.counts.adjLines);
+  w.tab().number(saturate(fn.calls));
+  w.endLine();
+  const ObjRecord* rec = file.record;
+  if (rec) {
+    std::size_t last = std::min<std::size_t>(fn.lastMapIndex, rec->map.size() - 1);
+    for (std::size_t i = fn.firstMapIndex; !rec->map.empty() && i <= last; ++i) {
+      if (mapTag(rec->map[i]) != TagBlock) continue;
+      std::uint32_t hits = i < rec->counts.size() ? rec->counts[i] : 0;
+      w.text("bl\t").number(mapValue(rec->map[i])).tab().number(saturate(hits));
+      w.endLine();
+    }
+  }
+  if (fn.firstLine != 0) {
+    std::uint32_t last = std::min<std::uint32_t>(fn.lastLine, std::uint32_t(file.lineStates.size()));
+    for (std::uint32_t l = fn.firstLine; l <= last; ++l) {
+      const LineState& s = file.lineStates[l - 1];
+      if (!lineHasCode(s.flags) || lineUnusedDead(s.flags, s.count)) continue;
+      w.text("li\t").number(l).tab().text(exportCountText(true, s.flags, s.count));
+      w.endLine();
+    }
+  }
+  w.text("efu\t").text(fn.name).endLine();
+}
+
+}  // namespace
+
+ErrorCode writeExport(FILE* stream, const SumRoot& root) {
+  return writeExport(stream, root, std::time(nullptr));
+}
+
+ErrorCode writeExport(FILE* stream, const SumRoot& root, std::time_t when) {
+  clearPendingSystemError();
+  GuardedWriter w(stream);
+  writeHeader(w, when);
+  const SumCounts& t = root.counts;
+  w.text("to\t").number(t.unusedBlocks).tab().number(t.blocks).tab().number(t.adjUnusedLines);
+  w.tab().number(t.adjLines).tab().number(root.unusedFuncs).tab().number(root.funcs);
+  w.tab().number(root.files).tab().number(root.dirs);
+  w.endLine();
+  for (const SumDir* d : root.dirOrder) {
+    if (w.failed()) break;
+    const SumCounts& c = d->counts;
+    w.text("di\t").text(d->name).tab().number(c.unusedBlocks).tab().number(c.blocks);
+    w.tab().number(c.adjUnusedLines).tab().number(c.adjLines).tab().number(d->unusedFuncs);
+    w.tab().number(d->funcs).tab().number(d->files);
+    w.endLine();
+    for (const SumFile* f : d->fileOrder) {
+      if (w.failed()) break;
+      const SumCounts& fc = f->counts;
+      w.text("fi\t").text(f->name).tab().number(fc.unusedBlocks).tab().number(fc.blocks);
+      w.tab().number(fc.adjUnusedLines).tab().number(fc.adjLines).tab().number(f->unusedFuncs);
+      w.tab().number(f->funcs).tab().number(saturate(f->sessions));
+      w.endLine();
+      for (const SumFunc* fn : f->funcOrder) writeFunction(w, *f, *fn);
+      w.text("efi\t").text(f->name).endLine();
+    }
+    w.text("edi\t").text(d->name).endLine();
+  }
+  return w.finish();
+}
+
+ErrorCode exportToFile(const SumRoot& root, const std::string& path) {
+  AtomicFileWriter out;
+  ErrorCode rc = out.open(path);
+  if (rc != allOK) return writeError;
+  rc = writeExport(out.stream(), root);
+  if (rc != allOK) {
+    out.abandon();
+    return rc;
+  }
+  return out.commit();
+}
