@@ -5,6 +5,8 @@
 #include <cerrno>
 #include <charconv>
 #include <cstring>
+#include <memory>
+#include <string_view>
 
 #include "startup/atomic_write.h"
 
@@ -61,41 +63,42 @@ std::uint32_t saturate(std::uint32_t v) { return v > kSaturation ? kSaturation :
 // write sets the flag; everything after it is dropped.
 class GuardedWriter {
  public:
-  explicit GuardedWriter(FILE* stream) : stream_(stream) {
-    errno = 0;
-    buf_.reserve(kChunk + 4096);
-  }
+  explicit GuardedWriter(FILE* stream) : stream_(stream), buf_(new char[kSize]) { errno = 0; }
 
   GuardedWriter& text(std::string_view s) {
-    buf_.append(s);
+    if (s.size() > kSize - used_) {
+      flush();
+      if (s.size() > kSize) {
+        writeOut(s.data(), s.size());
+        return *this;
+      }
+    }
+    std::memcpy(buf_.get() + used_, s.data(), s.size());
+    used_ += s.size();
     return *this;
   }
-  GuardedWriter& tab() {
-    buf_.push_back('\t');
-    return *this;
-  }
+  GuardedWriter& text(const char* s) { return text(std::string_view(s)); }
+  GuardedWriter& tab() { return ch('\t'); }
   GuardedWriter& number(std::uint32_t v) {
-    char digits[16];
-    auto res = std::to_chars(digits, digits + sizeof digits, v);
-    buf_.append(digits, static_cast<std::size_t>(res.ptr - digits));
+    if (kSize - used_ < 16) flush();
+    auto res = std::to_chars(buf_.get() + used_, buf_.get() + used_ + 16, v);
+    used_ = static_cast<std::size_t>(res.ptr - buf_.get());
     return *this;
   }
-  // Ends a line; the buffer goes out once it is large.
+  // Ends a line; the buffer goes out once it is nearly full.
   void endLine() {
-    buf_.push_back('\n');
-    if (buf_.size() >= kChunk) flush();
+    ch('\n');
+    if (used_ >= kFlushAt) flush();
   }
 
   void flush() {
-    if (!failed_ && !buf_.empty()) {
-      std::size_t n = std::fwrite(buf_.data(), 1, buf_.size(), stream_);
-      if (n != buf_.size() || std::fflush(stream_) != 0) fail();
-    }
-    buf_.clear();
+    writeOut(buf_.get(), used_);
+    used_ = 0;
   }
 
   ErrorCode finish() {
     flush();
+    if (!failed_ && std::fflush(stream_) != 0) fail();
     if (!failed_) return allOK;
     if (savedErrno_ == EPIPE) {
       clearPendingSystemError();
@@ -107,8 +110,18 @@ class GuardedWriter {
   bool failed() const { return failed_; }
 
  private:
-  static constexpr std::size_t kChunk = 1 << 16;
+  static constexpr std::size_t kSize = 1 << 17;
+  static constexpr std::size_t kFlushAt = kSize - 4096;
 
+  GuardedWriter& ch(char c) {
+    if (used_ == kSize) flush();
+    buf_[used_++] = c;
+    return *this;
+  }
+  void writeOut(const char* data, std::size_t n) {
+    if (failed_ || n == 0) return;
+    if (std::fwrite(data, 1, n, stream_) != n) fail();
+  }
   void fail() {
     failed_ = true;
     savedErrno_ = errno != 0 ? errno : EIO;
@@ -116,7 +129,8 @@ class GuardedWriter {
   }
 
   FILE* stream_;
-  std::string buf_;
+  std::unique_ptr<char[]> buf_;
+  std::size_t used_ = 0;
   bool failed_ = false;
   int savedErrno_ = 0;
 };
@@ -164,8 +178,14 @@ void writeFunction(GuardedWriter& w, const SumFile& file, const SumFunc& fn) {
     std::uint32_t last = std::min<std::uint32_t>(fn.lastLine, std::uint32_t(file.lineStates.size()));
     for (std::uint32_t l = fn.firstLine; l <= last; ++l) {
       const LineState& s = file.lineStates[l - 1];
-      if (!lineHasCode(s.flags) || lineUnusedDead(s.flags, s.count)) continue;
-      w.text("li\t").number(l).tab().text(exportCountText(true, s.flags, s.count));
+      if (!(s.flags & LineHasCode)) continue;
+      if ((s.flags & kAdjustMask) && lineUnusedDead(s.flags, s.count)) continue;
+      w.text("li\t").number(l).tab();
+      if (s.count != 0) {
+        w.number(saturate(s.count));
+      } else {
+        w.text(exportCountText(true, s.flags, s.count));
+      }
       w.endLine();
     }
   }

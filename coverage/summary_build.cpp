@@ -281,13 +281,21 @@ void buildLineStates(SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
   if (set) {
     for (std::uint32_t l = 1; l <= f.lineCount; ++l) states[l - 1].flags |= set->lineKinds(l);
   }
+  // Lines without adjustments (nearly all) are decided here; the others by the predicates.
   classPass(
-      states, [](const LineState& s) { return lineHasCode(s.flags); },
-      [](const LineState& s) { return lineUsed(s.flags, s.count); },
+      states, [](const LineState& s) { return (s.flags & LineHasCode) != 0; },
+      [](const LineState& s) { return (s.flags & LineHasCode) && s.count != 0; },
       [](LineState& s, std::uint32_t c) { s.actualClass = c; });
   classPass(
-      states, [](const LineState& s) { return lineCountsForAdjusted(s.flags, s.count); },
-      [](const LineState& s) { return lineAdjustedUsed(s.flags, s.count); },
+      states,
+      [](const LineState& s) {
+        return (s.flags & kAdjustMask) ? lineCountsForAdjusted(s.flags, s.count)
+                                       : (s.flags & LineHasCode) != 0;
+      },
+      [](const LineState& s) {
+        return (s.flags & kAdjustMask) ? lineAdjustedUsed(s.flags, s.count)
+                                       : (s.flags & LineHasCode) && s.count != 0;
+      },
       [](LineState& s, std::uint32_t c) { s.adjustedClass = c; });
 }
 
