@@ -2,6 +2,7 @@
 #include "adjust/annotated_listing.h"
 
 #include <cstdio>
+#include <new>
 
 std::string annotatedListingLine(const std::string& countText, const std::string& text) {
   char head[64];
@@ -14,9 +15,13 @@ ErrorCode writeAnnotatedListing(SrcFile& src, const std::vector<AnnotatedLine>& 
                                 SourcePrompter& prompter) {
   ErrorCode rc = src.openForWriting(path, prompt, !path.empty(), prompter);
   if (rc != allOK) return rc;
-  for (const AnnotatedLine& line : lines) {
-    rc = src.writeLine(annotatedListingLine(line.countText, line.text));
-    if (rc != allOK) break;
+  try {
+    for (const AnnotatedLine& line : lines) {
+      rc = src.writeLine(annotatedListingLine(line.countText, line.text));
+      if (rc != allOK) break;
+    }
+  } catch (const std::bad_alloc&) {
+    rc = outOfMemory;
   }
   if (rc != allOK) {
     // Puts nothing in place: the target keeps its old contents.

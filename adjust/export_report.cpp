@@ -6,6 +6,7 @@
 #include <charconv>
 #include <cstring>
 #include <memory>
+#include <new>
 #include <string_view>
 
 #include "startup/atomic_write.h"
@@ -198,8 +199,9 @@ ErrorCode writeExport(FILE* stream, const SumRoot& root) {
   return writeExport(stream, root, std::time(nullptr));
 }
 
-ErrorCode writeExport(FILE* stream, const SumRoot& root, std::time_t when) {
-  clearPendingSystemError();
+namespace {
+
+ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when) {
   GuardedWriter w(stream);
   writeHeader(w, when);
   const SumCounts& t = root.counts;
@@ -227,6 +229,19 @@ ErrorCode writeExport(FILE* stream, const SumRoot& root, std::time_t when) {
     w.text("edi\t").text(d->name).endLine();
   }
   return w.finish();
+}
+
+}  // namespace
+
+ErrorCode writeExport(FILE* stream, const SumRoot& root, std::time_t when) {
+  clearPendingSystemError();
+  try {
+    return writeReport(stream, root, when);
+  } catch (const std::bad_alloc&) {
+    return outOfMemory;
+  } catch (...) {
+    return fatalInternalError;
+  }
 }
 
 ErrorCode exportToFile(const SumRoot& root, const std::string& path) {

@@ -3,6 +3,7 @@
 #include "adjust/extraction.h"
 
 #include <cstdio>
+#include <new>
 
 #include "adjust/adjust_settings.h"
 #include "adjust/adjustment_list.h"
@@ -42,8 +43,9 @@ std::string manyFilesMessage(const std::string& format, unsigned long files,
   return out;
 }
 
-ExtractionOutcome extractAllAdjustments(SumRoot& root, const std::string& skipPath,
-                                        ExtractionQuestion& question) {
+namespace {
+
+ExtractionOutcome extract(SumRoot& root, const std::string& skipPath, ExtractionQuestion& question) {
   ExtractionOutcome outcome;
   AdjustSettings settings = adjustSettings();
   unsigned long files = root.files;
@@ -109,4 +111,18 @@ ExtractionOutcome extractAllAdjustments(SumRoot& root, const std::string& skipPa
   outcome.writeStatus = writeAdjustmentsFile();
   outcome.recomputeStatus = recomputeSummary(root, root.hitsPolicy, list);
   return outcome;
+}
+
+}  // namespace
+
+ExtractionOutcome extractAllAdjustments(SumRoot& root, const std::string& skipPath,
+                                        ExtractionQuestion& question) {
+  try {
+    return extract(root, skipPath, question);
+  } catch (const std::bad_alloc&) {
+    ExtractionOutcome failed;
+    failed.performed = true;
+    failed.recomputeStatus = outOfMemory;
+    return failed;
+  }
 }

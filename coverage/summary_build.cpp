@@ -6,6 +6,7 @@
 #include <cctype>
 #include <cstdio>
 #include <cstdlib>
+#include <new>
 #include <string_view>
 #include <unordered_map>
 #include <utility>
@@ -14,6 +15,8 @@
 #include "coverage/summary_sort.h"
 
 namespace {
+
+constexpr std::uint32_t kMaxSourceLines = 1u << 24;
 
 // Adjustment sets by path, first entry of a path winning as in the list's own lookup.
 class AdjustIndex {
@@ -184,6 +187,9 @@ ErrorCode FileCounter::run() {
           account(fn.counts, l, c);
           fn.lastLine = l;
         }
+        // No source file has this many lines; such a number can only come from damaged
+        // data, and the line states for it would exhaust memory.
+        if (fn.lastLine > kMaxSourceLines) return corruptKgvFile;
         f_.lineCount = std::max(f_.lineCount, fn.lastLine);
       }
     }
@@ -399,9 +405,10 @@ std::uint32_t getHitsPolicy() {
   return policy;
 }
 
-ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
-                       const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out) {
-  out.reset();
+namespace {
+
+ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
+                    const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out) {
   auto root = std::make_unique<SumRoot>();
   root->hitsPolicy = hitsPolicy;
 
@@ -490,10 +497,32 @@ ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hit
   return allOK;
 }
 
+}  // namespace
+
+ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
+                       const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out) {
+  out.reset();
+  try {
+    return buildTree(data, sortOrder, hitsPolicy, adjustments, out);
+  } catch (const std::bad_alloc&) {
+    out.reset();
+    return outOfMemory;
+  } catch (...) {
+    out.reset();
+    return fatalInternalError;
+  }
+}
+
 ErrorCode recomputeSummary(SumRoot& root, std::uint32_t hitsPolicy,
                            const AdjustmentList& adjustments) {
   root.hitsPolicy = hitsPolicy;
-  return computeStatistics(root, hitsPolicy, AdjustIndex(adjustments));
+  try {
+    return computeStatistics(root, hitsPolicy, AdjustIndex(adjustments));
+  } catch (const std::bad_alloc&) {
+    return outOfMemory;
+  } catch (...) {
+    return fatalInternalError;
+  }
 }
 
 void setViewState(SumRoot& root, std::uint32_t value) {

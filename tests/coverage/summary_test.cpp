@@ -234,7 +234,9 @@ TEST(SummaryTree, DirectoriesAndFilesAreGroupedAndNativeOrderIsTheRecordOrder) {
 
 TEST(SummaryTree, BadMapsGiveCorruptDataAndNoTree) {
   for (const char* text :
-       {"record a.c\nblock 3\n",                              // a block outside a function
+       {"record a.c\nfunction f line=1\nblock 0x0FFFFFF0\n",       // a line no file has
+        "record a.c\nfunction f line=0x0FFFFFFF\n",
+        "record a.c\nblock 3\n",                              // a block outside a function
         "record a.c\nfunction f line=1\nblock 2\nentry 2 0\n",  // a file entry among blocks
         "record a.c\nfunction f line=1\nblockline 2\n"}) {     // blocks start with a line
     auto b = build(text);
