@@ -3,12 +3,13 @@
 #include "adjust/export_report.h"
 
 #include <cerrno>
-#include <charconv>
 #include <cstring>
 #include <memory>
 #include <new>
 #include <string_view>
 
+#include "adjust/adjustment_list.h"
+#include "coverage/summary_build.h"
 #include "startup/atomic_write.h"
 
 namespace {
@@ -58,6 +59,11 @@ const char* const kKeyLines[] = {
     "          and that a single block may span multiple lines.",
 };
 
+const char kDigitPairs[] =
+    "00010203040506070809101112131415161718192021222324252627282930313233343536373839"
+    "40414243444546474849505152535455565758596061626364656667686970717273747576777879"
+    "8081828384858687888990919293949596979899";
+
 std::uint32_t saturate(std::uint32_t v) { return v > kSaturation ? kSaturation : v; }
 
 // Collects output in a buffer and hands it to the stream in large writes. The first failed
@@ -80,10 +86,25 @@ class GuardedWriter {
   }
   GuardedWriter& text(const char* s) { return text(std::string_view(s)); }
   GuardedWriter& tab() { return ch('\t'); }
+  // Two digits at a time: most numbers of a report are small line numbers and counts.
   GuardedWriter& number(std::uint32_t v) {
     if (kSize - used_ < 16) flush();
-    auto res = std::to_chars(buf_.get() + used_, buf_.get() + used_ + 16, v);
-    used_ = static_cast<std::size_t>(res.ptr - buf_.get());
+    std::size_t n = 1;
+    for (std::uint32_t rest = v; rest >= 10; rest /= 10) ++n;
+    char* q = buf_.get() + used_ + n;
+    used_ += n;
+    while (v >= 100) {
+      q -= 2;
+      q[0] = kDigitPairs[2 * (v % 100)];
+      q[1] = kDigitPairs[2 * (v % 100) + 1];
+      v /= 100;
+    }
+    if (v < 10) {
+      q[-1] = static_cast<char>('0' + v);
+    } else {
+      q[-2] = kDigitPairs[2 * v];
+      q[-1] = kDigitPairs[2 * v + 1];
+    }
     return *this;
   }
   // Ends a line; the buffer goes out once it is nearly full.
@@ -160,7 +181,8 @@ void writeHeader(GuardedWriter& w, std::time_t when) {
   w.text(hashes).endLine();
 }
 
-void writeFunction(GuardedWriter& w, const SumFile& file, const SumFunc& fn) {
+void writeFunction(GuardedWriter& w, const SumFile& file, const std::vector<LineState>& states,
+                   const SumFunc& fn) {
   w.text("fu\t").text(fn.name).tab().number(fn.counts.unusedBlocks).tab().number(fn.counts.blocks);
   w.tab().number(fn.counts.adjUnusedLines).tab().number(fn.counts.adjLines);
   w.tab().number(saturate(fn.calls));
@@ -176,9 +198,9 @@ void writeFunction(GuardedWriter& w, const SumFile& file, const SumFunc& fn) {
     }
   }
   if (fn.firstLine != 0) {
-    std::uint32_t last = std::min<std::uint32_t>(fn.lastLine, std::uint32_t(file.lineStates.size()));
+    std::uint32_t last = std::min<std::uint32_t>(fn.lastLine, std::uint32_t(states.size()));
     for (std::uint32_t l = fn.firstLine; l <= last; ++l) {
-      const LineState& s = file.lineStates[l - 1];
+      const LineState& s = states[l - 1];
       if (!(s.flags & LineHasCode)) continue;
       if ((s.flags & kAdjustMask) && lineUnusedDead(s.flags, s.count)) continue;
       w.text("li\t").number(l).tab();
@@ -202,6 +224,7 @@ ErrorCode writeExport(FILE* stream, const SumRoot& root) {
 namespace {
 
 ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when) {
+  LazyLineStates lineStates(adjustmentList(), root.hitsPolicy);
   GuardedWriter w(stream);
   writeHeader(w, when);
   const SumCounts& t = root.counts;
@@ -223,7 +246,8 @@ ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when) {
       w.tab().number(fc.adjUnusedLines).tab().number(fc.adjLines).tab().number(f->unusedFuncs);
       w.tab().number(f->funcs).tab().number(saturate(f->sessions));
       w.endLine();
-      for (const SumFunc* fn : f->funcOrder) writeFunction(w, *f, *fn);
+      const std::vector<LineState>& states = lineStates.of(*f);
+      for (const SumFunc* fn : f->funcOrder) writeFunction(w, *f, states, *fn);
       w.text("efi\t").text(f->name).endLine();
     }
     w.text("edi\t").text(d->name).endLine();

@@ -211,39 +211,62 @@ void markLine(std::vector<LineState>& states, std::uint32_t lineNo, std::uint32_
   if (lineNo != 0 && lineNo <= states.size()) states[lineNo - 1].flags |= flag;
 }
 
-// One class pass; `relevant` and `good` are line predicates.
-template <typename Relevant, typename Good, typename Store>
-void classPass(std::vector<LineState>& states, Relevant relevant, Good good, Store store) {
-  std::size_t previous = 0;  // 1-based; 0 = none
+// The state of one class pass over a file's lines.
+struct ClassPass {
+  std::size_t previous = 0;  // 1-based line of the previous relevant line; 0 = none
   std::uint32_t previousClass = 0;
   bool inFunction = false;
-  for (std::size_t l = 1; l <= states.size(); ++l) {
-    LineState& s = states[l - 1];
+
+  // The class of line l; lines between two relevant lines of the same class in a function
+  // are filled through `store`.
+  template <typename Store>
+  std::uint32_t step(std::vector<LineState>& states, std::size_t l, std::uint32_t flags,
+                     bool relevant, bool good, Store store) {
     std::uint32_t cls = ClassNothing;
-    if (s.flags & LineFuncStart) inFunction = true;
-    if (relevant(s)) {
-      bool isGood = good(s);
-      cls = isGood ? ClassUsed : ClassUnused;
+    if (flags & LineFuncStart) inFunction = true;
+    if (relevant) {
+      cls = good ? ClassUsed : ClassUnused;
       if (cls == previousClass && inFunction && previous != 0) {
         for (std::size_t k = previous + 1; k < l; ++k)
-          store(states[k - 1], isGood ? ClassBetweenUsed : ClassBetweenUnused);
+          store(states[k - 1], good ? ClassBetweenUsed : ClassBetweenUnused);
       }
       previous = l;
       previousClass = cls;
     }
-    store(s, cls);
-    if (s.flags & LineFuncEnd) {
+    if (flags & LineFuncEnd) {
       inFunction = false;
       previous = 0;
     }
+    return cls;
+  }
+};
+
+// Both passes in one walk: actual (relevant = has code, good = used) and adjusted
+// (relevant = counts for adjusted coverage, good = adjusted used).
+void classifyLines(std::vector<LineState>& states) {
+  ClassPass actual, adjusted;
+  for (std::size_t l = 1; l <= states.size(); ++l) {
+    LineState& s = states[l - 1];
+    std::uint32_t flags = s.flags;
+    bool code = (flags & LineHasCode) != 0;
+    bool used = code && s.count != 0;
+    bool adjRelevant = code, adjGood = used;
+    // Lines without adjustments (nearly all) are decided here; the others by the predicates.
+    if (flags & kAdjustMask) {
+      adjRelevant = lineCountsForAdjusted(flags, s.count);
+      adjGood = lineAdjustedUsed(flags, s.count);
+    }
+    s.actualClass = actual.step(states, l, flags, code, used,
+                                [](LineState& t, std::uint32_t c) { t.actualClass = c; });
+    s.adjustedClass = adjusted.step(states, l, flags, adjRelevant, adjGood,
+                                    [](LineState& t, std::uint32_t c) { t.adjustedClass = c; });
   }
 }
 
-void buildLineStates(SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
-                     bool checkCorrupted) {
-  f.lineStates.assign(f.lineCount, LineState{});
+void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
+                     bool checkCorrupted, std::vector<LineState>& states) {
+  states.assign(f.lineCount, LineState{});
   if (f.lineCount == 0) return;
-  std::vector<LineState>& states = f.lineStates;
   const std::vector<std::uint32_t>& map = f.record->map;
   const std::vector<std::uint16_t>& counts = f.record->counts;
   std::uint32_t last = 0;
@@ -287,22 +310,7 @@ void buildLineStates(SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
   if (set) {
     for (std::uint32_t l = 1; l <= f.lineCount; ++l) states[l - 1].flags |= set->lineKinds(l);
   }
-  // Lines without adjustments (nearly all) are decided here; the others by the predicates.
-  classPass(
-      states, [](const LineState& s) { return (s.flags & LineHasCode) != 0; },
-      [](const LineState& s) { return (s.flags & LineHasCode) && s.count != 0; },
-      [](LineState& s, std::uint32_t c) { s.actualClass = c; });
-  classPass(
-      states,
-      [](const LineState& s) {
-        return (s.flags & kAdjustMask) ? lineCountsForAdjusted(s.flags, s.count)
-                                       : (s.flags & LineHasCode) != 0;
-      },
-      [](const LineState& s) {
-        return (s.flags & kAdjustMask) ? lineAdjustedUsed(s.flags, s.count)
-                                       : (s.flags & LineHasCode) && s.count != 0;
-      },
-      [](LineState& s, std::uint32_t c) { s.adjustedClass = c; });
+  classifyLines(states);
 }
 
 void addTimes(std::uint32_t& first, std::uint32_t& last, std::uint32_t f, std::uint32_t l) {
@@ -310,7 +318,8 @@ void addTimes(std::uint32_t& first, std::uint32_t& last, std::uint32_t f, std::u
   last = std::max(last, l);
 }
 
-ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustIndex& index) {
+ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustIndex& index,
+                            bool withLineStates) {
   root.counts = SumCounts{};
   root.funcs = root.unusedFuncs = root.deadFuncs = root.files = 0;
   root.firstTime = 0x7FFFFFFF;
@@ -339,7 +348,14 @@ ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustInd
     addTimes(root.firstTime, root.lastTime, d.firstTime, d.lastTime);
   }
   for (SumDir& d : root.dirRecords) {
-    for (SumFile& f : d.fileRecords) buildLineStates(f, policy, index.find(d, f), checkCorrupted);
+    for (SumFile& f : d.fileRecords) {
+      if (withLineStates) {
+        buildLineStates(f, policy, index.find(d, f), checkCorrupted, f.lineStates);
+      } else {
+        f.lineStates.clear();
+        f.lineStates.shrink_to_fit();
+      }
+    }
   }
   return allOK;
 }
@@ -408,7 +424,8 @@ std::uint32_t getHitsPolicy() {
 namespace {
 
 ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
-                    const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out) {
+                    const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out,
+                    bool withLineStates) {
   auto root = std::make_unique<SumRoot>();
   root->hitsPolicy = hitsPolicy;
 
@@ -490,7 +507,7 @@ ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPo
     }
   }
 
-  rc = computeStatistics(*root, hitsPolicy, AdjustIndex(adjustments));
+  rc = computeStatistics(*root, hitsPolicy, AdjustIndex(adjustments), withLineStates);
   if (rc != allOK) return rc;
   sortSummary(*root, sortOrder);
   out = std::move(root);
@@ -500,10 +517,11 @@ ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPo
 }  // namespace
 
 ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
-                       const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out) {
+                       const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out,
+                       bool withLineStates) {
   out.reset();
   try {
-    return buildTree(data, sortOrder, hitsPolicy, adjustments, out);
+    return buildTree(data, sortOrder, hitsPolicy, adjustments, out, withLineStates);
   } catch (const std::bad_alloc&) {
     out.reset();
     return outOfMemory;
@@ -517,7 +535,7 @@ ErrorCode recomputeSummary(SumRoot& root, std::uint32_t hitsPolicy,
                            const AdjustmentList& adjustments) {
   root.hitsPolicy = hitsPolicy;
   try {
-    return computeStatistics(root, hitsPolicy, AdjustIndex(adjustments));
+    return computeStatistics(root, hitsPolicy, AdjustIndex(adjustments), true);
   } catch (const std::bad_alloc&) {
     return outOfMemory;
   } catch (...) {
@@ -585,4 +603,22 @@ SumFile* findSumFile(SumRoot& root, const std::string& path) {
     if (it != d.fileRecords.end() && std::string_view(it->name) == base) return &*it;
   }
   return nullptr;
+}
+
+struct LazyLineStates::Index {
+  explicit Index(const AdjustmentList& list) : sets(list) {}
+  AdjustIndex sets;
+};
+
+LazyLineStates::LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy)
+    : index_(std::make_unique<Index>(adjustments)), policy_(hitsPolicy),
+      checkCorrupted_(std::getenv("PROCESS_CORRUPTED_LINES") != nullptr) {}
+
+LazyLineStates::~LazyLineStates() = default;
+
+const std::vector<LineState>& LazyLineStates::of(const SumFile& file) {
+  if (file.lineCount == 0 || !file.lineStates.empty() || !file.dir || !file.record)
+    return file.lineStates;
+  buildLineStates(file, policy_, index_->sets.find(*file.dir, file), checkCorrupted_, scratch_);
+  return scratch_;
 }

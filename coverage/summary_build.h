@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "adjust/adjustment_list.h"
 #include "adjust/errors.h"
@@ -25,9 +26,11 @@ std::uint32_t getHitsPolicy();
 std::uint32_t hitsPolicyFromText(const char* value);
 
 // Builds the whole tree and sorts it. The data's maps may be reordered in place where a
-// function's blocks are out of line order. On failure nothing is handed back.
+// function's blocks are out of line order. On failure nothing is handed back. Without line
+// states (a report that reads each file once) they are made per file by LazyLineStates.
 ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
-                       const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out);
+                       const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out,
+                       bool withLineStates = true);
 
 // Counts and line states again over an existing tree (after the adjustments changed); the
 // records, names and order stay.
@@ -41,3 +44,22 @@ void carryViewState(SumRoot* newRoot, const SumRoot* oldRoot, std::uint32_t defa
 
 // The first file whose directory name followed by its base name is the path; nullptr if none.
 SumFile* findSumFile(SumRoot& root, const std::string& path);
+
+// The line states of a file: those of the tree when it has them, else made on request
+// (into a buffer reused for the next file) from the adjustments and the hits policy.
+class LazyLineStates {
+ public:
+  LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy);
+  ~LazyLineStates();
+  LazyLineStates(const LazyLineStates&) = delete;
+  LazyLineStates& operator=(const LazyLineStates&) = delete;
+  // Valid until the next call.
+  const std::vector<LineState>& of(const SumFile& file);
+
+ private:
+  struct Index;
+  std::unique_ptr<Index> index_;
+  std::uint32_t policy_;
+  bool checkCorrupted_;
+  std::vector<LineState> scratch_;
+};

@@ -275,7 +275,12 @@ ErrorCode prepareStartupSummary(StartupState& s, StartupSummary& out) {
   out.hitsPolicy = getHitsPolicy();
 
   // 15. The summary.
-  rc = buildSummary(*out.data, out.sortOrder, out.hitsPolicy, adjustmentList(), out.summary);
+  // The report alone reads each file's line states once: they are made as it goes, except
+  // when damaged line numbers are to be reported before anything else.
+  bool lineStatesLater =
+      s.mode == RunMode::exportReport && std::getenv("PROCESS_CORRUPTED_LINES") == nullptr;
+  rc = buildSummary(*out.data, out.sortOrder, out.hitsPolicy, adjustmentList(), out.summary,
+                    !lineStatesLater);
   if (rc != allOK) {
     reportError(rc, "Couldn't summarize information:\n%s\n", errorMessage(rc).c_str());
     return rc;

@@ -72,6 +72,14 @@ std::string exportText(const SumRoot& root, std::time_t when) {
   return kgtest::readFile(path);
 }
 
+// True when no file of the tree holds line states.
+bool noLineStatesKept(const SumRoot& root) {
+  for (const SumDir& d : root.dirRecords)
+    for (const SumFile& f : d.fileRecords)
+      if (!f.lineStates.empty()) return false;
+  return true;
+}
+
 class InUtc : public ::testing::Test {
  protected:
   void SetUp() override {
@@ -98,6 +106,18 @@ TEST_F(InUtc, TheReportOfASmallDataSetMatchesTheCheckedFile) {
   std::string golden = kgtest::readFile(kgtest::sourceDir() + "/tests/adjust/golden/export_small.txt");
   EXPECT_EQ(text, golden);
   if (getenv("KG_WRITE_GOLDEN")) kgtest::writeFile(getenv("KG_WRITE_GOLDEN"), text);
+}
+
+TEST_F(InUtc, LineStatesMadeWhileWritingGiveTheSameReport) {
+  Report r;
+  r.data = kgtest::readOk(kgtest::makeKgv(r.dir, "small.kgv", kSmallData));
+  AdjustmentList saved = std::move(adjustmentList());
+  adjustmentList() = smallAdjustments();
+  ASSERT_EQ(buildSummary(*r.data, 1, hitsMax, adjustmentList(), r.root, false), allOK);
+  EXPECT_TRUE(noLineStatesKept(*r.root));
+  std::string text = exportText(*r.root, 1700000000);
+  adjustmentList() = std::move(saved);
+  EXPECT_EQ(text, kgtest::readFile(kgtest::sourceDir() + "/tests/adjust/golden/export_small.txt"));
 }
 
 TEST_F(InUtc, EveryLineOfTheHeaderIsSeventyNineCharactersWide) {
