@@ -148,3 +148,20 @@ TEST(ViewCommand, TheWindowModeBuildsTheSummaryBeforeItsHandOver) {
   EXPECT_EQ(r.status, 5);
   EXPECT_EQ(r.err.rfind("Kestrelgauge: ", 0), 0u) << r.err;
 }
+
+TEST(ExportCommand, TheHitsPolicyComesFromTheEnvironment) {
+  Home home;
+  std::string data = kgtest::makeKgv(
+      home.dir, "h.kgv", "record h.c\nfunction f line=1 calls=1\nblock 2 hits=3\nblock 2 hits=0\n");
+  auto policy = [&](const std::string& value) {
+    auto r = runProcess({kestrel(), "-export", data}, home.env({"KESTREL_HITS_POLICY=" + value}));
+    EXPECT_EQ(r.status, 0) << r.err;
+    std::size_t at = r.out.find("\nli\t2\t");
+    return at == std::string::npos ? std::string("?") : r.out.substr(at + 6, r.out.find('\n', at + 1) - at - 6);
+  };
+  EXPECT_EQ(policy("max"), "3");
+  EXPECT_EQ(policy("FIRST"), "3");
+  EXPECT_EQ(policy("min"), "0");
+  EXPECT_EQ(policy("la_st"), "0");
+  EXPECT_EQ(policy("most"), "3");  // unknown: the default
+}
