@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <random>
 
+#include "adjust/export_report.h"
 #include "coverage/summary_build.h"
 #include "coverage/summary_sort.h"
 #include "summary/sort_orders.h"
@@ -473,6 +474,14 @@ TEST(SummaryTree, DamagedMapsGiveCorruptDataOrATreeButNeverACrash) {
       // A second build over the data as the first one left it succeeds too.
       std::unique_ptr<SumRoot> again;
       ASSERT_EQ(buildSummary(data, 1, hitsMax, adj, again), allOK);
+      // And the report is written from either tree, the second making line states as it goes.
+      std::unique_ptr<SumRoot> lazy;
+      ASSERT_EQ(buildSummary(data, 1, hitsMax, adj, lazy, false), allOK);
+      FILE* sink = fopen("/dev/null", "w");
+      ASSERT_NE(sink, nullptr);
+      EXPECT_EQ(writeExport(sink, *again), allOK);
+      EXPECT_EQ(writeExport(sink, *lazy), allOK);
+      fclose(sink);
     } else {
       ++corrupt;
       ASSERT_EQ(rc, corruptKgvFile);
