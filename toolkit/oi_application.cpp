@@ -115,8 +115,14 @@ OI_Application::~OI_Application() {
   XtDestroyApplicationContext(context_);
 }
 
-void OI_Application::installDatabase(XrmDatabase db) {
-  for (const auto& line : commandLineXrm_) XrmPutLineResource(&db, line.c_str());
+std::string OI_Application::displayResources() const {
+  const char* s = XResourceManagerString(display_);
+  return s ? s : "";
+}
+
+void OI_Application::installDatabase(XrmDatabase db, bool commandLineOnTop) {
+  if (commandLineOnTop)
+    for (const auto& line : commandLineXrm_) XrmPutLineResource(&db, line.c_str());
   XrmSetDatabase(display_, db);
 }
 
@@ -128,8 +134,16 @@ void OI_Application::run() {
 
 void OI_Application::quit() {
   XtAppSetExitFlag(context_);
-  // Wake an event wait so that the loop sees the flag at once.
-  if (shell_ && XtIsRealized(shell_)) {
+  wake();
+}
+
+void OI_Application::wake() {
+  // The event wait returns only for an X event: send one to the (unmapped) application shell.
+  if (shell_ && !XtIsRealized(shell_)) {
+    XtVaSetValues(shell_, XmNwidth, 1, XmNheight, 1, nullptr);
+    XtRealizeWidget(shell_);
+  }
+  if (shell_) {
     XEvent ev{};
     ev.xclient.type = ClientMessage;
     ev.xclient.window = XtWindow(shell_);

@@ -50,15 +50,23 @@ class OI_Application {
   // The application shell ("kestrel" of class "Kestrelgauge"); top-level windows are its popups.
   Widget shell() const { return shell_; }
 
-  // Makes `db` the display's resource database, with the -xrm settings of the command line put
-  // over it. The application takes ownership of `db`.
-  void installDatabase(XrmDatabase db);
+  // The server's resource property (as xrdb loaded it); empty when it has none.
+  std::string displayResources() const;
+  // The resource lines the command line gave: each -xrm line, and -geometry, -title, -bg, -fg
+  // and -iconic as the lines they stand for.
+  const std::vector<std::string>& commandLineResources() const { return commandLineXrm_; }
+  // Makes `db` the display's resource database; widgets made afterwards take their resources
+  // from it. With `commandLineOnTop` the command line's lines are put over it (for a database
+  // that does not hold them already). The display owns `db` from then on.
+  void installDatabase(XrmDatabase db, bool commandLineOnTop = false);
   XrmDatabase database() const;
 
   // Runs the event loop until `quit`.
   void run();
   void quit();
   bool quitting() const;
+  // Makes a waiting processOne return (after a timer or signal changed what it waits for).
+  void wake();
   // Handles one event or timer (waiting for one when none is pending).
   void processOne();
   // Handles everything now pending, without waiting.

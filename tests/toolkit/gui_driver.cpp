@@ -18,6 +18,10 @@ namespace {
 void sleepMs(int ms) { std::this_thread::sleep_for(std::chrono::milliseconds(ms)); }
 }  // namespace
 
+std::string x11LeakSuppressions() {
+  return "LSAN_OPTIONS=suppressions=" + sourceDir() + "/tests/lsan_x11.supp:print_suppressions=0";
+}
+
 bool WidgetInfo::flag(const std::string& name) const { return field(name) == "1"; }
 
 int WidgetInfo::number(const std::string& name) const {
@@ -109,6 +113,8 @@ GuiApp::GuiApp(const XvfbServer& server, const std::vector<std::string>& argv, c
     }
     setenv("DISPLAY", display_.c_str(), 1);
     setenv("KG_TEST_HOOK", hook.c_str(), 1);
+    std::string lsan = x11LeakSuppressions();
+    setenv("LSAN_OPTIONS", lsan.substr(lsan.find('=') + 1).c_str(), 1);
     for (const auto& e : env) {
       size_t eq = e.find('=');
       if (eq == std::string::npos) unsetenv(e.c_str());
@@ -132,6 +138,11 @@ GuiApp::~GuiApp() {
       waitExit(3000);
     }
   }
+}
+
+int GuiApp::stop() {
+  if (running()) kill(pid_, SIGTERM);
+  return waitExit(5000);
 }
 
 bool GuiApp::running() {

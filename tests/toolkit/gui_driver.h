@@ -46,6 +46,9 @@ struct Screenshot {
   uint32_t at(int x, int y) const;
 };
 
+// The environment setting that makes the sanitizer build ignore the X libraries' own caches.
+std::string x11LeakSuppressions();
+
 class GuiApp {
  public:
   GuiApp(const XvfbServer& server, const std::vector<std::string>& argv, const std::vector<std::string>& env = {});
@@ -54,6 +57,8 @@ class GuiApp {
   GuiApp& operator=(const GuiApp&) = delete;
 
   bool running();
+  // Asks the program to end (SIGTERM) and waits; its exit status, -1 when it did not end.
+  int stop();
   // Waits for the program to end; its exit status (128 + signal when killed), -1 on time-out.
   int waitExit(int timeoutMs);
   std::string errorOutput() const;

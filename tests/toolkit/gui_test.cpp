@@ -36,6 +36,12 @@ class ProbeWindow : public ::testing::Test {
     app = std::make_unique<GuiApp>(server, argv);
     ASSERT_TRUE(app->waitViewable("probeText", &last)) << app->errorOutput() << last.raw();
   }
+  void TearDown() override {
+    // Every window comes down in order; the sanitizer build reports any fault on the way.
+    if (app && app->running()) {
+      EXPECT_EQ(app->stop(), 0) << app->errorOutput();
+    }
+  }
   const WidgetInfo& text() {
     last = app->state();
     const WidgetInfo* t = last.find("probeText");
@@ -261,14 +267,28 @@ TEST_F(ProbeWindow, ResourcesOnTheCommandLineReachWidgetsByName) {
   EXPECT_EQ(app->waitExit(5000), 0) << app->errorOutput();
 }
 
+TEST_F(ProbeWindow, ADatabaseInstalledByTheProgramGivesWidgetsTheirResources) {
+  // The database comes from the program (as the settings build it); -xrm still wins over it.
+  ASSERT_FALSE(server.display().empty());
+  app = std::make_unique<GuiApp>(
+      server, std::vector<std::string>{probe(), "-xrm", "*probeInfo.labelString: From the command line"},
+      std::vector<std::string>{"PROBE_RESOURCES=*probeOpen.labelString: From the database\n"
+                               "*probeInfo.labelString: Overridden\n*probeGang*rows: 12\n"});
+  GuiState s;
+  ASSERT_TRUE(app->waitViewable("probeText", &s)) << app->errorOutput();
+  EXPECT_EQ(s.find("probeOpen")->field("label"), "From the database");
+  EXPECT_EQ(s.find("probeInfo")->field("label"), "From the command line");
+  EXPECT_EQ(s.find("probeText")->number("visible"), 12);
+}
+
 TEST(ProbeStart, WithoutADisplayTheToolkitSaysWhichOneFailed) {
-  ProcessResult r = runProcess({probe(), "-display", ":77777"});
+  ProcessResult r = runProcess({probe(), "-display", ":77777"}, {x11LeakSuppressions()});
   EXPECT_EQ(r.status, 3);
   EXPECT_EQ(r.err, "Can't open display :77777\n");
   XvfbServer server;
   ASSERT_FALSE(server.display().empty());
   // X options are taken out; what is left is the program's own business.
-  r = runProcess({probe(), "-display", server.display(), "-bogus"});
+  r = runProcess({probe(), "-display", server.display(), "-bogus"}, {x11LeakSuppressions()});
   EXPECT_EQ(r.status, 2);
   EXPECT_EQ(r.err, "unknown argument: -bogus\n");
 }

@@ -1,7 +1,9 @@
 // A small window built on the toolkit for the GUI tests: a menu bar, a toolbar row, two text panes
 // sharing a vertical scroll bar, a glyph and a popup menu. What the user does shows in the status
 // line (line 0 of the counts pane) and in the test hook's dump.
+#include <csignal>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <string>
 
@@ -37,6 +39,18 @@ int main(int argc, char** argv) {
   }
   OI_Application* app = OI_Application::instance();
   QR_OI_Init();
+  // A database of the program's own, as the settings build it, replaces the one Xt made.
+  if (const char* lines = getenv("PROBE_RESOURCES")) {
+    XrmDatabase db = XrmGetStringDatabase(lines);
+    app->installDatabase(db, true);
+  }
+  // SIGTERM ends the event loop, so that every window is taken down in order.
+  static XtSignalId termSignal = XtAppAddSignal(
+      app->context(), [](XtPointer, XtSignalId*) { OI_Application::instance()->quit(); }, nullptr);
+  struct sigaction sa {};
+  sa.sa_handler = [](int) { XtNoticeSignal(termSignal); };
+  sigemptyset(&sa.sa_mask);
+  sigaction(SIGTERM, &sa, nullptr);  // no SA_RESTART: the event wait must see the signal
   {
     OI_TopLevel win("probe", "Toolkit probe");
     win.setMinSize(200, 150);
