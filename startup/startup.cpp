@@ -8,7 +8,9 @@
 #include <cstring>
 
 #include "startup/diagnostic.h"
+#include "settings/settings_startup.h"
 #include "startup/runtime_options.h"
+#include "startup/settings_wiring.h"
 
 StartupState& startupState() {
   static StartupState s;
@@ -138,6 +140,13 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
     ErrorCode rc = displayCheck(argc, argv);
     if (rc != allOK) return rc;
   }
+
+  // 7. The user's resource settings, before the options.
+  ResourceSettingsInput settingsInput;
+  settingsInput.installDir = home;
+  settingsInput.language = s.language;
+  for (const auto& w : loadResourceSettings(settingsInput)) kgWarning("%s", w.c_str());
+  wireSettingsIntoEngine();
 
   // 9. Load step 1: options.
   s.options = makeViewerOptionTable();

@@ -1,0 +1,83 @@
+// Lookup, storing and merging of per-file adjustment entries.
+#include "adjust/adjustment_list.h"
+
+#include <ctime>
+#include <utility>
+
+AdjustEntry::AdjustEntry(KgvFileRef ref, CvgAdjustSetPtr set) : ref_(std::move(ref)) {
+  setSet(std::move(set));
+}
+
+void AdjustEntry::setSet(CvgAdjustSetPtr set) {
+  set_ = std::move(set);
+  ref_.payload = set_.get();
+}
+
+CvgAdjustSetPtr AdjustEntry::takeSet() {
+  ref_.payload = nullptr;
+  return std::move(set_);
+}
+
+int AdjustmentList::position(const std::string& path) const {
+  for (std::size_t i = 0; i < entries_.size(); ++i) {
+    if (entries_[i].resolvedName() == path) return static_cast<int>(i);
+  }
+  return -1;
+}
+
+AdjustEntry* AdjustmentList::findEntry(const std::string& path) {
+  int i = position(path);
+  return i < 0 ? nullptr : &entries_[static_cast<std::size_t>(i)];
+}
+
+CvgAdjustSet* AdjustmentList::findSet(const std::string& path, int* pos) {
+  int i = position(path);
+  if (pos) *pos = i;
+  return i < 0 ? nullptr : entries_[static_cast<std::size_t>(i)].set();
+}
+
+CvgAdjustSet* AdjustmentList::findSet(const std::string& dirName, const std::string& fileName) {
+  return findSet(dirName + fileName);
+}
+
+void AdjustmentList::append(AdjustEntry entry) { entries_.push_back(std::move(entry)); }
+
+bool AdjustmentList::storeSet(CvgAdjustSetPtr set, const std::string& path, std::uint32_t now) {
+  AdjustEntry entry(makeKgvFileRef(path, path), std::move(set));
+  entry.setLoadTime(now);
+  int i = position(path);
+  if (i >= 0) {
+    AdjustEntry& old = entries_[static_cast<std::size_t>(i)];
+    if (adjustSetsEqual(old.set(), entry.set())) return false;
+    old = std::move(entry);
+    return true;
+  }
+  entries_.push_back(std::move(entry));
+  return true;
+}
+
+CvgAdjustSet* AdjustmentList::setForPath(const std::string& path, CvgAdjustSetPtr set,
+                                         std::uint32_t now) {
+  if (!set) set = std::make_unique<CvgAdjustSet>();
+  storeSet(std::move(set), path, now);
+  return findSet(path);
+}
+
+void AdjustmentList::removeEntry(int pos) {
+  if (pos < 0 || static_cast<std::size_t>(pos) >= entries_.size()) return;
+  entries_.erase(entries_.begin() + pos);
+}
+
+AdjustmentList AdjustmentList::merge(AdjustmentList old, AdjustmentList fresh) {
+  for (AdjustEntry& e : old.entries_) {
+    if (fresh.position(e.resolvedName()) < 0) fresh.entries_.push_back(std::move(e));
+  }
+  return fresh;
+}
+
+AdjustmentList& adjustmentList() {
+  static AdjustmentList list;
+  return list;
+}
+
+std::uint32_t adjustmentTimeNow() { return static_cast<std::uint32_t>(time(nullptr)); }

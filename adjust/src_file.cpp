@@ -1,0 +1,339 @@
+// Source files: search, checks, display form, EUC conversion and safe writing back.
+#include "adjust/src_file.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <climits>
+#include <cstdlib>
+#include <vector>
+
+#include "adjust/adjust_settings.h"
+#include "adjust/code_set.h"
+#include "adjust/source_search_path.h"
+#include "startup/diagnostic.h"
+
+namespace {
+
+std::string baseName(const std::string& path) {
+  size_t slash = path.find_last_of('/');
+  return slash == std::string::npos ? path : path.substr(slash + 1);
+}
+
+std::string dirName(const std::string& path) {
+  size_t slash = path.find_last_of('/');
+  if (slash == std::string::npos) return ".";
+  return slash == 0 ? "/" : path.substr(0, slash);
+}
+
+bool readAll(FILE* f, std::string& out) {
+  out.clear();
+  char buf[65536];
+  size_t n;
+  while ((n = fread(buf, 1, sizeof buf, f)) > 0) out.append(buf, n);
+  return !ferror(f);
+}
+
+void closeFile(FILE*& f) {
+  if (f) fclose(f);
+  f = nullptr;
+}
+
+}  // namespace
+
+FILE* createTemporaryFile(const char* prefix, std::string& path) {
+  std::string dir = kgTempDirectory();
+  if (dir.empty()) dir = ".";
+  std::string templ = dir + (dir.back() == '/' ? "" : "/") + prefix + "XXXXXX";
+  std::vector<char> buf(templ.begin(), templ.end());
+  buf.push_back('\0');
+  int fd = mkstemp(buf.data());
+  if (fd < 0) {
+    path = templ;
+    return nullptr;
+  }
+  path = buf.data();
+  FILE* f = fdopen(fd, "w+");
+  if (!f) {
+    int err = errno;
+    close(fd);
+    unlink(path.c_str());
+    errno = err;
+  }
+  return f;
+}
+
+std::string writeTargetFor(const std::string& path) {
+  struct stat st;
+  if (lstat(path.c_str(), &st) == 0 && S_ISLNK(st.st_mode)) {
+    char* real = realpath(path.c_str(), nullptr);
+    if (real) {
+      std::string r = real;
+      free(real);
+      return r;
+    }
+  }
+  return path;
+}
+
+SrcFile::~SrcFile() {
+  closeStreams();
+  dropTemporary();
+}
+
+void SrcFile::closeStreams() {
+  if (current_ != file_ && current_ != temp_ && current_ != writer_.stream()) closeFile(current_);
+  current_ = nullptr;
+  closeFile(file_);
+}
+
+void SrcFile::dropTemporary() {
+  closeFile(temp_);
+  if (!tempPath_.empty()) {
+    unlink(tempPath_.c_str());
+    tempPath_.clear();
+  }
+}
+
+SrcFile::Candidate SrcFile::tryCandidate(const std::string& path, std::uint32_t buildTime,
+                                         SourcePrompter& prompter) {
+  if (path.empty()) return Candidate::failed;
+  // Non-blocking, so that a name that turns out to be a FIFO cannot hang the viewer.
+  int fd = open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+  if (fd < 0) return Candidate::failed;
+  struct stat st;
+  if (fstat(fd, &st) != 0) {
+    close(fd);
+    return Candidate::refused;
+  }
+  int flags = fcntl(fd, F_GETFL);
+  if (flags >= 0) fcntl(fd, F_SETFL, flags & ~O_NONBLOCK);
+  std::uint32_t codeSet = S_ISREG(st.st_mode) ? detectCodeSet(fd) : codeSetNotText;
+  if (codeSet == codeSetNotText) {
+    close(fd);
+    prompter.showError("File is not a plain text file", notTextFile);
+    return Candidate::refused;
+  }
+  const auto mtime = static_cast<std::uint32_t>(st.st_mtime);
+  if (buildTime != 0 && mtime >= buildTime &&
+      !prompter.askContinue("Source file has been modified since object file was compiled.")) {
+    close(fd);
+    return Candidate::refused;
+  }
+  FILE* f = fdopen(fd, "r");
+  if (!f) {
+    close(fd);
+    return Candidate::failed;
+  }
+  file_ = f;
+  modTime_ = mtime;
+  writable_ = access(path.c_str(), W_OK) == 0;
+  fileCodeSet_ = codeSet;
+  return Candidate::opened;
+}
+
+ErrorCode SrcFile::openForReading(const std::string& requestedName, const std::string& promptText,
+                                  std::uint32_t buildTime, SourcePrompter& prompter) {
+  if (state_ != stateNew) return errorOccured;
+  std::string candidate = requestedName;
+  Candidate result = tryCandidate(candidate, buildTime, prompter);
+  if (result == Candidate::failed) {
+    std::string alternative;
+    if (findInSourceSearchPath(baseName(requestedName), alternative)) {
+      candidate = alternative;
+      result = tryCandidate(candidate, buildTime, prompter);
+    }
+  }
+  while (result != Candidate::opened && !candidate.empty()) {
+    std::string name;
+    if (!prompter.askFileName(formatWithString(promptText, baseName(candidate)), name)) {
+      return noFileName;
+    }
+    candidate = name;
+    result = tryCandidate(candidate, buildTime, prompter);
+    if (result == Candidate::opened) addSourceSearchDirectory(dirName(candidate));
+  }
+  if (result != Candidate::opened) return noFileName;
+  requestedName_ = requestedName;
+  foundName_ = candidate;
+  ErrorCode rc = prepareDisplay();
+  if (rc != allOK) {
+    closeStreams();
+    dropTemporary();
+    return rc;
+  }
+  state_ = stateReading;
+  return allOK;
+}
+
+ErrorCode SrcFile::prepareDisplay() {
+  if (!codeSetNeedsConversion(fileCodeSet_)) {
+    current_ = file_;
+    displayCodeSet_ = fileCodeSet_;
+    return allOK;
+  }
+  std::string raw;
+  bool readOk = readAll(file_, raw);
+  int readErr = errno;
+  closeFile(file_);
+  temp_ = createTemporaryFile("kgXRd", tempPath_);
+  if (!temp_) {
+    recordSystemError(errno, "Converting %s\ninto EUC in %s\nprior to display", foundName_.c_str(),
+                      tempPath_.c_str());
+    tempPath_.clear();
+    return writeError;
+  }
+  std::string euc;
+  int err = 0;
+  if (!readOk) {
+    err = readErr ? readErr : EIO;
+  } else if (!(fileCodeSet_ == codeSetShiftJis ? shiftJisToEuc(raw, euc)
+                                               : jisToEuc(raw, euc, &asciiEscape_))) {
+    err = EILSEQ;
+  } else if (fwrite(euc.data(), 1, euc.size(), temp_) != euc.size() || fflush(temp_) != 0) {
+    err = errno ? errno : EIO;
+  }
+  if (err) {
+    recordSystemError(err, "Writing EUC version of %s\ninto %s\nprior to display",
+                      foundName_.c_str(), tempPath_.c_str());
+    dropTemporary();
+    return fileWriteFailed;
+  }
+  rewind(temp_);
+  current_ = temp_;
+  displayCodeSet_ = codeSetEuc;
+  return allOK;
+}
+
+bool SrcFile::readLine(std::string& line) {
+  line.clear();
+  if (state_ != stateReading || !current_) return false;
+  char* buf = nullptr;
+  size_t cap = 0;
+  ssize_t len = getline(&buf, &cap, current_);
+  if (len < 0) {
+    free(buf);
+    return false;
+  }
+  line.assign(buf, static_cast<size_t>(len));
+  free(buf);
+  if (!line.empty() && line.back() == '\n') line.pop_back();
+  if (line == "\f") {
+    line = "^L";
+  } else if (line.empty()) {
+    line = " ";
+  } else if (displayCodeSet_ == codeSetPlain) {
+    for (char& ch : line) {
+      auto u = static_cast<unsigned char>(ch);
+      if (u == '\t' || u == '\r') continue;
+      if (u >= 0x80 || u < 0x20 || u == 0x7F) ch = '?';
+    }
+  }
+  return true;
+}
+
+void SrcFile::closeReading() {
+  if (state_ != stateReading) return;
+  closeStreams();
+  dropTemporary();
+  state_ = stateClosed;
+}
+
+ErrorCode SrcFile::openForWriting(const std::string& path, const std::string& promptText,
+                                  bool pathGiven, SourcePrompter& prompter) {
+  if (state_ != stateClosed) return errorOccured;
+  std::string target = path;
+  if (!pathGiven && !prompter.askFileName(formatWithString(promptText, baseName(path)), target)) {
+    return noFileName;
+  }
+  for (;;) {
+    ErrorCode rc = writer_.open(writeTargetFor(target));
+    if (rc == allOK) break;
+    if (pathGiven) return rc;
+    if (!prompter.askFileName(formatWithString(promptText, baseName(target)), target)) {
+      return noFileName;
+    }
+  }
+  outputName_ = target;
+  writeFailed_ = false;
+  if (codeSetNeedsConversion(fileCodeSet_)) {
+    temp_ = createTemporaryFile("kgXWr", tempPath_);
+    if (!temp_) {
+      int err = errno;
+      writer_.abandon();
+      recordSystemError(err, "Opening %s\nfor converting the display from EUC\nback to the proper format.",
+                        tempPath_.c_str());
+      tempPath_.clear();
+      return writeError;
+    }
+    current_ = temp_;
+  } else {
+    current_ = writer_.stream();
+  }
+  state_ = stateWriting;
+  return allOK;
+}
+
+ErrorCode SrcFile::writeLine(const std::string& text) {
+  if (state_ != stateWriting || !current_) return fileWriteFailed;
+  std::string out;
+  if (text == " ") {
+    out = "\n";
+  } else if (text.starts_with("^L")) {
+    out = "\f" + text.substr(2) + "\n";
+  } else {
+    out = text + "\n";
+  }
+  if (fwrite(out.data(), 1, out.size(), current_) != out.size()) {
+    writeFailed_ = true;
+    recordSystemError(errno ? errno : EIO, "while writing into %s", outputName_.c_str());
+    return fileWriteFailed;
+  }
+  return allOK;
+}
+
+ErrorCode SrcFile::finishWriting() {
+  if (state_ != stateWriting) return errorOccured;
+  ErrorCode rc = allOK;
+  if (temp_) {
+    std::string euc, converted;
+    int err = 0;
+    if (fflush(temp_) != 0 || ferror(temp_)) {
+      err = errno ? errno : EIO;
+    } else {
+      rewind(temp_);
+      if (!readAll(temp_, euc)) {
+        err = errno ? errno : EIO;
+      } else if (!(fileCodeSet_ == codeSetShiftJis
+                       ? eucToShiftJis(euc, converted)
+                       : eucToJis(euc, fileCodeSet_, asciiEscape_, converted))) {
+        err = EILSEQ;
+      } else if (fwrite(converted.data(), 1, converted.size(), writer_.stream()) !=
+                 converted.size()) {
+        err = errno ? errno : EIO;
+      }
+    }
+    if (err) {
+      recordSystemError(err, "Translating from EUC (%s)\ninto destination %s.\n", tempPath_.c_str(),
+                        outputName_.c_str());
+      rc = fileWriteFailed;
+    } else if (writeFailed_) {
+      recordSystemError(EIO, "while writing into %s", outputName_.c_str());
+      rc = fileWriteFailed;
+    }
+    dropTemporary();
+  } else if (writeFailed_) {
+    recordSystemError(EIO, "while writing into %s", outputName_.c_str());
+    rc = fileWriteFailed;
+  }
+  current_ = nullptr;
+  if (rc == allOK) {
+    rc = writer_.commit();
+  } else {
+    writer_.abandon();
+  }
+  state_ = stateClosed;
+  return rc;
+}

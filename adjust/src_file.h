@@ -1,0 +1,82 @@
+// One source file opened for display and for writing back: finding it, checking it,
+// handing out its lines in display form, and writing lines back in the file's own code set.
+#pragma once
+
+#include <cstdint>
+#include <cstdio>
+#include <string>
+
+#include "adjust/errors.h"
+#include "adjust/source_prompter.h"
+#include "startup/atomic_write.h"
+
+class SrcFile {
+ public:
+  enum : std::uint32_t { stateNew = 0, stateReading = 1, stateClosed = 2, stateWriting = 3 };
+
+  SrcFile() = default;
+  ~SrcFile();
+  SrcFile(const SrcFile&) = delete;
+  SrcFile& operator=(const SrcFile&) = delete;
+
+  // Finds the file (as named, along the source search path, then by asking), checks that
+  // it is text and not newer than buildTime (0 = no check), and prepares the display form.
+  // Only from the new state.
+  ErrorCode openForReading(const std::string& requestedName, const std::string& promptText,
+                           std::uint32_t buildTime, SourcePrompter& prompter);
+  // The next line in display form; false at end of file.
+  bool readLine(std::string& line);
+  void closeReading();
+
+  // Starts writing to path (or to a path asked for with the prompt when pathGiven is false).
+  // The file is replaced only when finishWriting succeeds. Only from the closed state.
+  ErrorCode openForWriting(const std::string& path, const std::string& promptText, bool pathGiven,
+                           SourcePrompter& prompter);
+  // One line in display form; written back in the file's own form.
+  ErrorCode writeLine(const std::string& text);
+  // Converts back when needed and puts the new file in place.
+  ErrorCode finishWriting();
+
+  std::uint32_t state() const { return state_; }
+  const std::string& requestedName() const { return requestedName_; }
+  const std::string& foundName() const { return foundName_; }
+  const std::string& outputName() const { return outputName_; }
+  const std::string& temporaryPath() const { return tempPath_; }
+  std::uint32_t modificationTime() const { return modTime_; }
+  bool writable() const { return writable_; }
+  std::uint32_t displayCodeSet() const { return displayCodeSet_; }
+  std::uint32_t fileCodeSet() const { return fileCodeSet_; }
+
+ private:
+  enum class Candidate { opened, failed, refused };
+  Candidate tryCandidate(const std::string& path, std::uint32_t buildTime,
+                         SourcePrompter& prompter);
+  ErrorCode prepareDisplay();
+  void dropTemporary();
+  void closeStreams();
+
+  std::uint32_t state_ = stateNew;
+  std::string requestedName_;
+  std::string foundName_;
+  std::string tempPath_;
+  std::string outputName_;
+  FILE* current_ = nullptr;  // the file or the temporary copy; not owned separately
+  FILE* file_ = nullptr;
+  FILE* temp_ = nullptr;
+  std::uint32_t modTime_ = 0;
+  bool writable_ = false;
+  std::uint32_t displayCodeSet_ = 1;
+  std::uint32_t fileCodeSet_ = 1;
+  std::string asciiEscape_;  // how the JIS file returned to one-byte text
+  AtomicFileWriter writer_;
+  bool writeFailed_ = false;
+};
+
+// A temporary file in the temporary directory, created safely with a unique name that
+// begins with the prefix, open for reading and writing. nullptr on failure (errno set;
+// path then holds the name pattern).
+FILE* createTemporaryFile(const char* prefix, std::string& path);
+
+// Where writing to `path` must go so that a symbolic link keeps pointing at the new file:
+// the link's real target, or the path itself.
+std::string writeTargetFor(const std::string& path);

@@ -1,0 +1,167 @@
+// The table of every preference and changeable text with its default, range and save flag.
+#include "settings/resource_table.h"
+
+#include <memory>
+
+#include "settings/resource_converters.h"
+
+const char* const kDefaultEditCursor = "leftbutton";
+
+namespace {
+std::unique_ptr<KG_Settings> gSettings;
+}
+
+KG_Settings::KG_Settings(const ResourceSource& src)
+    : directoryNames(src, "directoryNames", KG_DirectoryStyleResource::whole, true),
+      coverageChangesOption(src, "coverageChangesOption", KG_FileUpdateResource::prompt, true),
+      highlightDeadcodeLines(src, "highlightDeadcodeLines", false, true),
+      highlightInspectedLines(src, "highlightInspectedLines", false, true),
+      highlightTestedLines(src, "highlightTestedLines", false, true),
+      highlightUnusedLines(src, "highlightUnusedLines", true, true),
+      highlightUsedLines(src, "highlightUsedLines", false, true),
+      longDirectoryNames(src, "longDirectoryNames", KG_NameTruncationResource::rightmost, true),
+      longFileNames(src, "longFileNames", KG_NameTruncationResource::leftmost, true),
+      longFunctionNames(src, "longFunctionNames", KG_NameTruncationResource::leftmost, true),
+      nameColumnWidth(src, "nameColumnWidth", 32, 32, 200, true),
+      showAdjustedAnnotations(src, "showAdjustedAnnotations", true, true),
+      showCounts(src, "showCounts", true, true),
+      showLineNumbers(src, "showLineNumbers", true, true),
+      showToolbar(src, "showToolbar", true, true),
+      sortCriterion(src, "sortCriterion", kDefaultSortCriterion, true),
+      outlineDataColumnSeparators(src, "outlineDataColumnSeparators", KG_ColStripeResource::groups, true),
+      summaryLines(src, "summaryLines", 30, 10, 100, true),
+      suppressCplusplusArgumentList(src, "suppressCplusplusArgumentList", false, true),
+      suppressCplusplusClassName(src, "suppressCplusplusClassName", false, true),
+      suppressCplusplusOperatorPrefix(src, "suppressCplusplusOperatorPrefix", false, true),
+      adjustmentCommentFormat(src, "adjustmentCommentFormat", " /* %s */", false),
+      adjustmentDisableString(src, "adjustmentDisableString", " NOT", false),
+      adjustmentExtractWarnThreshold(src, "adjustmentExtractWarnThreshold", 50, false),
+      crmsCommandString(src, "crmsCommandString", "", false),
+      crmsQueryCommandString(src, "crmsQueryCommandString", "", false),
+      deadcodeLineBackground(src, "deadcodeLineBackground", "reverse", false),
+      inspectedLineBackground(src, "inspectedLineBackground", "reverse", false),
+      dubiousAdjustmentBackground(src, "dubiousAdjustmentBackground", "reverse", false),
+      testedLineBackground(src, "testedLineBackground", "reverse", false),
+      unusedLineBackground(src, "unusedLineBackground", "reverse", false),
+      usedLineBackground(src, "usedLineBackground", "reverse", false),
+      deadcodeLineForeground(src, "deadcodeLineForeground", "reverse", false),
+      inspectedLineForeground(src, "inspectedLineForeground", "reverse", false),
+      dubiousAdjustmentForeground(src, "dubiousAdjustmentForeground", "reverse", false),
+      testedLineForeground(src, "testedLineForeground", "reverse", false),
+      unusedLineForeground(src, "unusedLineForeground", "reverse", false),
+      usedLineForeground(src, "usedLineForeground", "reverse", false),
+      highlightDubiousAdjustments(src, "highlightDubiousAdjustments", true, false),
+      hideDeadcodeCounts(src, "hideDeadcodeCounts", false, false),
+      highlightCodelessRegions(src, "highlightCodelessRegions", true, false),
+      filePollRetryInterval(src, "filePollRetryInterval", 6, 1, 1000000, false),
+      showMergeWarnings(src, "showMergeWarnings", true, false),
+      saveAdjustmentsAtExit(src, "saveAdjustmentsAtExit", true, false),
+      saveSourceAtExit(src, "saveSourceAtExit", true, false),
+      stopAfterCodelessRegions(src, "stopAfterCodelessRegions", false, false),
+      xdefaultsUpdateCommandString(src, "xdefaultsUpdateCommandString", "quor_invoke_xdef_edit", false),
+      actualCoverageShown(src, "actualCoverageShown", "Cannot edit adjustments when viewing actual coverage", false),
+      compileAdjWindowErrorsPrompt(src, "compileAdjWindowErrorsPrompt", "These warnings occurred while extracting adjustments:", false),
+      manySourceFilesToProcess(src, "manySourceFilesToProcess", "%u files to process; this may take a while", false),
+      readAdjFileWarningsPrompt(src, "readAdjFileWarningsPrompt", "These warnings occurred while reading the file:", false),
+      reloadAdjFileWarningsPrompt(src, "reloadAdjFileWarningsPrompt", "These warnings occurred while reloading the files:", false),
+      loadingSourceBusyMsg(src, "loadingSourceBusyMsg", "Constructing annotated source.", false),
+      loadingKgvDataBusyMsg(src, "loadingKgvDataBusyMsg", "Loading requested data.", false),
+      outlineSortBusyMsg(src, "outlineSortBusyMsg", "Performing requested sorting operation.", false),
+      coverageActualPrompt(src, "coverageActualPrompt", "(Actual coverage) ", false),
+      coverageAdjustedPrompt(src, "coverageAdjustedPrompt", "(Adjusted coverage) ", false),
+      exportKgvFilePrompt(src, "exportKgvFilePrompt", "Write export data to file:", false),
+      fileNotFoundPrompt(src, "fileNotFoundPrompt", "Can't find source file \"%s\".  New name:", false),
+      noCodeTherePrompt(src, "noCodeTherePrompt", "There is no code there to adjust", false),
+      noLinesSelectedPrompt(src, "noLinesSelectedPrompt", "No lines are selected", false),
+      openKgvFilePrompt(src, "openKgvFilePrompt", "Open Kestrelgauge file:", false),
+      readOnlyAdjustmentsPrompt(src, "readOnlyAdjustmentsPrompt", "[Adjustments read only]", false),
+      readOnlySourcePrompt(src, "readOnlySourcePrompt", "[Read only]", false),
+      readOnlyWarningPrompt(src, "readOnlyWarningPrompt", "Source is read only", false),
+      saveOutlinePrompt(src, "saveOutlinePrompt", "Write outline to file:", false),
+      saveKgvFilePrompt(src, "saveKgvFilePrompt", "Write .kgv data to file:", false),
+      saveScriptOutputPrompt(src, "saveScriptOutputPrompt", "Write script output to file:", false),
+      sourceNeedsSavePrompt(src, "sourceNeedsSavePrompt", "The annotated source has been modified but not saved.", false),
+      lineNumberPaneTitle(src, "lineNumberPaneTitle", " Line", false),
+      hitCountsPaneTitle(src, "hitCountsPaneTitle", "Hits", false),
+      annotatedSourcePaneTitle(src, "annotatedSourcePaneTitle", "Annotated Source", false),
+      adjustmentEditPaneTitle(src, "adjustmentEditPaneTitle", "D I T", false),
+      turnAdjustsOffPrompt(src, "turnAdjustsOffPrompt", "Ignore code adjustments", false),
+      turnAdjustsOnPrompt(src, "turnAdjustsOnPrompt", "Apply code adjustments", false),
+      turnToolbarOffPrompt(src, "turnToolbarOffPrompt", "Hide toolbar", false),
+      turnToolbarOnPrompt(src, "turnToolbarOnPrompt", "Make toolbar visible", false),
+      writeAnnotatedPrompt(src, "writeAnnotatedPrompt", "Write annotated source to file:", false),
+      writeSourcePrompt(src, "writeSourcePrompt", "Write source to file:", false),
+      writeXdefaultsPrompt(src, "writeXdefaultsPrompt", "Write viewer settings to file:", false),
+      mergedDataNeedsSavePrompt(src, "mergedDataNeedsSavePrompt", "The merged coverage data has not been saved.", false),
+      scriptOutputsNeedSavePrompt(src, "scriptOutputsNeedSavePrompt", "Output from the run of a script has not saved.", false),
+      deadcodeFunctionText(src, "deadcodeFunctionText", "dead", false),
+      unusedFunctionText(src, "unusedFunctionText", "unused", false),
+      usedFunctionText(src, "usedFunctionText", "used", false),
+      deleteGUIAdjustments(src, "deleteGUIAdjustments", true, false),
+      deleteAdjustmentsBeforeInsert(src, "deleteAdjustmentsBeforeInsert", true, false),
+      invalidateUserAdjustments(src, "invalidateUserAdjustments", true, false),
+      adjustEditCursor(src, "adjustEditCursor", kDefaultEditCursor, false),
+      filePollPauseInterval(src, "filePollPauseInterval", 3, 1, 1000000, false),
+      showMergeWarningDetails(src, "showMergeWarningDetails", true, false),
+      debugRevealIdlerActivity(src, "debugRevealIdlerActivity", false, false),
+      saveMergedDataAtExit(src, "saveMergedDataAtExit", false, false),
+      saveScriptOutputsAtExit(src, "saveScriptOutputsAtExit", false, false),
+      outlineHeaderColumnSeparators(src, "outlineHeaderColumnSeparators", KG_ColStripeResource::none, false),
+      annotatedSourceWindowMinHeight(src, "annotatedSourceWindowMinHeight", 200, 50, 15000, false),
+      viewerWindowMinHeight(src, "viewerWindowMinHeight", 200, 50, 15000, false),
+      scriptOutputWindowMinHeight(src, "scriptOutputWindowMinHeight", 200, 50, 15000, false),
+      annotatedSourceWindowMinWidth(src, "annotatedSourceWindowMinWidth", 400, 50, 15000, false),
+      viewerWindowMinWidth(src, "viewerWindowMinWidth", 300, 50, 15000, false),
+      scriptOutputWindowMinWidth(src, "scriptOutputWindowMinWidth", 200, 50, 15000, false),
+      showNumberOfDirectories(src, "showNumberOfDirectories", false, false),
+      showNumberOfFiles(src, "showNumberOfFiles", false, true),
+      showCompilationDate(src, "showCompilationDate", false, false),
+      showNumberOfRuns(src, "showNumberOfRuns", true, true),
+      showOldestSessionDate(src, "showOldestSessionDate", false, true),
+      showNewestSessionDate(src, "showNewestSessionDate", false, true),
+      showRealTime(src, "showRealTime", false, false),
+      showCpuTime(src, "showCpuTime", false, false),
+      showNumberOfCalls(src, "showNumberOfCalls", true, true),
+      showFunctionsUnused(src, "showFunctionsUnused", true, true),
+      showFunctionsPercentUnused(src, "showFunctionsPercentUnused", false, true),
+      showFunctionsUsed(src, "showFunctionsUsed", true, true),
+      showFunctionsPercentUsed(src, "showFunctionsPercentUsed", true, true),
+      showFunctionsTotal(src, "showFunctionsTotal", false, true),
+      showFunctionsDeadcode(src, "showFunctionsDeadcode", false, true),
+      showFunctionsPercentDeadcode(src, "showFunctionsPercentDeadcode", false, true),
+      showAdjustedLinesUnused(src, "showAdjustedLinesUnused", true, true),
+      showAdjustedLinesPercentUnused(src, "showAdjustedLinesPercentUnused", false, true),
+      showAdjustedLinesUsed(src, "showAdjustedLinesUsed", true, true),
+      showAdjustedLinesPercentUsed(src, "showAdjustedLinesPercentUsed", true, true),
+      showAdjustedLinesTotal(src, "showAdjustedLinesTotal", false, true),
+      showLinesUnused(src, "showLinesUnused", false, true),
+      showLinesPercentUnused(src, "showLinesPercentUnused", false, true),
+      showLinesUsed(src, "showLinesUsed", false, true),
+      showLinesPercentUsed(src, "showLinesPercentUsed", false, true),
+      showLinesTotal(src, "showLinesTotal", false, true),
+      showDeadcodeAdjustments(src, "showDeadcodeAdjustments", false, true),
+      showInspectedAdjustments(src, "showInspectedAdjustments", false, true),
+      showTestedAdjustments(src, "showTestedAdjustments", false, true),
+      showTotalAdjustments(src, "showTotalAdjustments", true, true),
+      showBlocksUnused(src, "showBlocksUnused", false, true),
+      showBlocksPercentUnused(src, "showBlocksPercentUnused", false, true),
+      showBlocksUsed(src, "showBlocksUsed", false, true),
+      showBlocksPercentUsed(src, "showBlocksPercentUsed", false, true),
+      showBlocksTotal(src, "showBlocksTotal", false, true) {}
+
+KG_Settings& buildSettings(const ResourceSource& src) {
+  // The old table leaves the registry before the new one enters it.
+  gSettings.reset();
+  gSettings = std::make_unique<KG_Settings>(src);
+  return *gSettings;
+}
+
+KG_Settings& kgSettings() {
+  if (!gSettings) buildSettings(ResourceSource{});
+  return *gSettings;
+}
+
+void rereadSettings(const ResourceSource& src) {
+  kgSettings();
+  for (KG_Resource* r : registeredResources()) r->reread(src);
+}

@@ -1,0 +1,171 @@
+// Reading lcov tracefiles and gcov JSON, laying the lines out as functions, and refusing
+// bad input with the file and line of the problem.
+#include <gtest/gtest.h>
+#include <zlib.h>
+
+#include "tests/support/test_support.h"
+#include "tools/import/coverage_import.h"
+#include "tools/import/record_layout.h"
+
+namespace {
+
+ImportedData lcov(const std::string& text) {
+  ImportedData d;
+  ImportError e;
+  EXPECT_TRUE(readLcovTracefile("t.info", text, d, e)) << e.text();
+  return d;
+}
+
+std::string lcovError(const std::string& text) {
+  ImportedData d;
+  ImportError e;
+  EXPECT_FALSE(readLcovTracefile("t.info", text, d, e));
+  return e.text();
+}
+
+const LaidOutFunction& fn(const LaidOutRecord& r, const std::string& name) {
+  for (const auto& f : r.functions)
+    if (f.name == name) return f;
+  ADD_FAILURE() << "no function " << name;
+  static LaidOutFunction none;
+  return none;
+}
+
+std::vector<std::uint32_t> lines(const LaidOutFunction& f) {
+  std::vector<std::uint32_t> v;
+  for (const auto& l : f.lines) v.push_back(l.line);
+  return v;
+}
+
+}  // namespace
+
+TEST(LcovTracefiles, BothFunctionFormsChecksumsAndRepeatedRecordsAddUp) {
+  ImportedData d = lcov(
+      "TN:unit\nSF:/src/a.c\nFN:3,main\nFN:10,12,helper\nFNDA:2,main\nFNDA:0,helper\nFNF:2\nFNH:1\n"
+      "DA:3,2,abcdef\nDA:4,2\nDA:11,0\nBRDA:4,0,0,1\nBRF:1\nBRH:1\nLF:3\nLH:2\nend_of_record\n"
+      "TN:other\nSF:/src/a.c\nFNDA:3,main\nDA:4,5\nDA:20,1\nend_of_record\n");
+  ASSERT_EQ(d.files.size(), 1u);
+  ImportedFile& f = d.files[0];
+  EXPECT_EQ(f.lines.at(4), 7u);
+  EXPECT_EQ(f.lines.at(20), 1u);
+  EXPECT_EQ(f.function("main").calls, 5u);
+  EXPECT_EQ(f.function("helper").endLine, 12u);
+}
+
+TEST(LcovTracefiles, FunctionIndexRecordsOfNewerLcov) {
+  ImportedData d = lcov("SF:x.c\nFNL:0,5,9\nFNA:0,4,f\nFNA:0,0,f_alias\nDA:6,4\nend_of_record\n");
+  auto& file = d.files[0];
+  EXPECT_EQ(file.function("f").startLine, 5u);
+  EXPECT_EQ(file.function("f").endLine, 9u);
+  EXPECT_EQ(file.function("f").calls, 4u);
+  EXPECT_EQ(file.function("f_alias").startLine, 5u);
+}
+
+TEST(LcovTracefiles, BadInputNamesFileAndLine) {
+  EXPECT_EQ(lcovError("SF:a.c\nDA:x,1\nend_of_record\n"), "t.info:2: malformed DA record 'x,1'");
+  EXPECT_EQ(lcovError("DA:1,1\n"), "t.info:1: DA before any SF record");
+  EXPECT_EQ(lcovError("SF:a.c\nDA:1,1\n"),
+            "t.info:3: the last record has no end_of_record (the file may be truncated)");
+  EXPECT_EQ(lcovError("SF:a.c\nthis is not lcov\nend_of_record\n"),
+            "t.info:2: not a tracefile line: 'this is not lcov'");
+  EXPECT_EQ(lcovError("SF:a.c\nFNA:3,1,f\nend_of_record\n"),
+            "t.info:2: FNA record for function index 3 without FNL");
+  EXPECT_EQ(lcovError("SF:a.c\nDA:0,1\nend_of_record\n"), "t.info:2: malformed DA record '0,1'");
+  // Huge counts saturate instead of being refused.
+  ImportedData d = lcov("SF:a.c\nDA:1,99999999999999999999999\nend_of_record\n");
+  EXPECT_EQ(saturatedCount(d.files[0].lines.at(1)), 10000u);
+}
+
+TEST(GcovJson, DocumentsFilesFunctionsAndLines) {
+  std::string doc =
+      R"j({"format_version":"1","current_working_directory":"/build","files":[{"file":"src/a.c",)j"
+      R"j("functions":[{"name":"_Z1fi","demangled_name":"f(int)","start_line":2,"end_line":4,)j"
+      R"j("execution_count":3}],"lines":[{"line_number":3,"count":3},{"line_number":8,"count":0}]}]})j";
+  ImportedData d;
+  ImportError e;
+  ASSERT_TRUE(readGcovJson("a.json", doc + "\n" + doc + "\n", d, e)) << e.text();
+  ASSERT_EQ(d.files.size(), 1u);
+  EXPECT_EQ(d.files[0].path, "/build/src/a.c");
+  EXPECT_EQ(d.files[0].function("f(int)").calls, 6u);
+  EXPECT_EQ(d.files[0].lines.at(3), 6u);
+}
+
+TEST(GcovJson, BadDocumentsNameTheLine) {
+  ImportedData d;
+  ImportError e;
+  EXPECT_FALSE(readGcovJson("b.json", "{\"files\": [\n{\"file\": \"a.c\",\n \"lines\": [oops]}]}", d, e));
+  EXPECT_EQ(e.line, 3u);
+  EXPECT_EQ(e.text().rfind("b.json:3: not valid JSON", 0), 0u) << e.text();
+  EXPECT_FALSE(readGcovJson("c.json", "{\"files\": 3}", d, e));
+  EXPECT_EQ(e.text(), "c.json:1: not gcov JSON: no \"files\" array");
+  EXPECT_FALSE(readGcovJson("d.json", "{\"files\":[{\"file\":\"a.c\",\"lines\":[{\"count\":1}]}]}", d, e));
+  EXPECT_EQ(e.text(), "d.json:1: a line entry of a.c has no line number or count");
+  EXPECT_FALSE(readGcovJson("e.json", "{\"files\":[{\"file\":\"a.c\"", d, e));
+  EXPECT_EQ(e.text().rfind("e.json:1: not valid JSON", 0), 0u) << e.text();
+}
+
+TEST(Layout, LinesGoToTheInnermostFunctionAndTheRestToFileScope) {
+  ImportedFile f;
+  f.path = "/src/n.cc";
+  f.function("outer").startLine = 10;
+  f.function("outer").endLine = 30;
+  f.function("outer").calls = 1;
+  f.function("lambda").startLine = 15;
+  f.function("lambda").endLine = 18;
+  f.function("lambda").calls = 20000;
+  for (std::uint32_t l : {5u, 11u, 16u, 18u, 19u, 31u}) f.addLine(l, l == 16 ? 70000 : 1);
+  LaidOutRecord r = layOutRecord(f);
+  ASSERT_EQ(r.functions.size(), 3u);
+  EXPECT_EQ(r.functions[0].name, "outer");
+  EXPECT_EQ(lines(fn(r, "outer")), (std::vector<std::uint32_t>{11, 19}));
+  EXPECT_EQ(lines(fn(r, "lambda")), (std::vector<std::uint32_t>{16, 18}));
+  EXPECT_EQ(fn(r, "lambda").calls, 10000u);
+  EXPECT_EQ(fn(r, "lambda").lines[0].hits, 10000u);
+  EXPECT_EQ(r.functions[2].name, "(file scope)");
+  EXPECT_EQ(lines(r.functions[2]), (std::vector<std::uint32_t>{5, 31}));
+  EXPECT_EQ(r.functions[2].firstLine, 5u);
+  EXPECT_EQ(r.sessions, 1u);
+  EXPECT_NE(r.signature, 0u);
+}
+
+TEST(Layout, UnknownEndsReachToTheNextFunctionAndTheHashFollowsStructure) {
+  ImportedFile f;
+  f.path = "/src/a.c";
+  f.function("a").startLine = 1;
+  f.function("b").startLine = 5;
+  for (std::uint32_t l : {2u, 4u, 5u, 9u}) f.addLine(l, 1);
+  LaidOutRecord r = layOutRecord(f);
+  EXPECT_EQ(lines(fn(r, "a")), (std::vector<std::uint32_t>{2, 4}));
+  EXPECT_EQ(lines(fn(r, "b")), (std::vector<std::uint32_t>{5, 9}));
+  // Same structure, other counts: same signature; one more line: another.
+  ImportedFile g = f;
+  g.lines[2] = 40;
+  EXPECT_EQ(layOutRecord(g).signature, r.signature);
+  g.addLine(10, 0);
+  EXPECT_NE(layOutRecord(g).signature, r.signature);
+}
+
+TEST(Inputs, CompressedAndPlainFilesReadAlikeAndFormatsAreRecognised) {
+  kgtest::TempDir dir;
+  std::string text = "TN:\nSF:a.c\nDA:1,1\nend_of_record\n";
+  kgtest::writeFile(dir.file("plain.info"), text);
+  gzFile gz = gzopen(dir.file("packed.info.gz").c_str(), "wb");
+  ASSERT_NE(gz, nullptr);
+  gzwrite(gz, text.data(), static_cast<unsigned>(text.size()));
+  gzclose(gz);
+  std::string a, b;
+  ImportError e;
+  ASSERT_TRUE(readInputText(dir.file("plain.info"), a, e));
+  ASSERT_TRUE(readInputText(dir.file("packed.info.gz"), b, e));
+  EXPECT_EQ(a, text);
+  EXPECT_EQ(b, text);
+  EXPECT_EQ(detectFormat(a), InputFormat::lcov);
+  EXPECT_EQ(detectFormat("  \n{\"files\":[]}"), InputFormat::gcovJson);
+  EXPECT_EQ(detectFormat("GIF89a"), InputFormat::unknown);
+  // A truncated archive is an error, not a short input.
+  std::string packed = kgtest::readFile(dir.file("packed.info.gz"));
+  kgtest::writeFile(dir.file("cut.gz"), packed.substr(0, packed.size() - 6));
+  EXPECT_FALSE(readInputText(dir.file("cut.gz"), a, e));
+  EXPECT_FALSE(readInputText(dir.file("missing.info"), a, e));
+  EXPECT_EQ(e.text().rfind(dir.file("missing.info") + ": cannot open", 0), 0u);
+}

@@ -1,0 +1,172 @@
+// gcov's JSON intermediate format (gcov --json-format, GCC 9 to 14), one or several
+// documents per input.
+#include <nlohmann/json.hpp>
+
+#include <cstring>
+
+#include "tools/import/coverage_import.h"
+
+namespace {
+
+using nlohmann::json;
+
+std::uint64_t lineOfOffset(const std::string& text, size_t offset) {
+  if (offset > text.size()) offset = text.size();
+  std::uint64_t line = 1;
+  for (size_t i = 0; i < offset; ++i) line += text[i] == '\n';
+  return line;
+}
+
+// Splits the input into its top-level JSON values (gcov --stdout writes one per line).
+bool documents(const std::string& text, std::vector<std::pair<size_t, size_t>>& out) {
+  size_t i = 0, n = text.size();
+  while (true) {
+    while (i < n && strchr(" \t\r\n", text[i])) ++i;
+    if (i >= n) return true;
+    size_t start = i;
+    int depth = 0;
+    bool inString = false;
+    for (; i < n; ++i) {
+      char c = text[i];
+      if (inString) {
+        if (c == '\\') ++i;
+        else if (c == '"') inString = false;
+      } else if (c == '"') {
+        inString = true;
+      } else if (c == '{' || c == '[') {
+        ++depth;
+      } else if (c == '}' || c == ']') {
+        if (--depth == 0) {
+          ++i;
+          break;
+        }
+      }
+    }
+    out.emplace_back(start, i);
+    if (depth != 0 || inString) return true;  // the parser reports the truncation
+  }
+}
+
+bool unsignedField(const json& obj, const char* key, std::uint64_t& value) {
+  auto it = obj.find(key);
+  if (it == obj.end()) return false;
+  if (it->is_number_unsigned()) value = it->get<std::uint64_t>();
+  else if (it->is_number_integer()) value = it->get<std::int64_t>() < 0 ? 0 : static_cast<std::uint64_t>(it->get<std::int64_t>());
+  else if (it->is_number_float()) {
+    double d = it->get<double>();
+    value = d <= 0 || d != d ? 0 : d >= 1.8e19 ? UINT64_MAX : static_cast<std::uint64_t>(d);
+  } else return false;
+  return true;
+}
+
+bool lineField(const json& obj, const char* key, std::uint32_t& line) {
+  std::uint64_t v;
+  if (!unsignedField(obj, key, v) || v > 0x0FFFFFFF) return false;
+  line = static_cast<std::uint32_t>(v);
+  return true;
+}
+
+std::string absolute(const std::string& path, const std::string& dir) {
+  if (path.empty() || path[0] == '/' || dir.empty()) return path;
+  std::string p = path;
+  while (p.compare(0, 2, "./") == 0) p.erase(0, 2);
+  return dir.back() == '/' ? dir + p : dir + "/" + p;
+}
+
+struct Reader {
+  const std::string& name;
+  const std::string& text;
+  ImportedData& data;
+  ImportError& error;
+
+  bool fail(size_t offset, const std::string& message) {
+    error.file = name;
+    error.line = lineOfOffset(text, offset);
+    error.message = message;
+    return false;
+  }
+
+  bool document(size_t start, size_t end) {
+    json doc;
+    try {
+      doc = json::parse(text.begin() + static_cast<std::ptrdiff_t>(start),
+                        text.begin() + static_cast<std::ptrdiff_t>(end));
+    } catch (const json::parse_error& e) {
+      size_t at = e.byte == 0 ? start : start + e.byte - 1;
+      return fail(at, std::string("not valid JSON: ") + (strchr(e.what(), ':') ? strchr(e.what(), ':') + 2 : e.what()));
+    }
+    if (!doc.is_object()) return fail(start, "a gcov JSON document must be an object");
+    auto files = doc.find("files");
+    if (files == doc.end() || !files->is_array())
+      return fail(start, "not gcov JSON: no \"files\" array");
+    std::string cwd;
+    auto c = doc.find("current_working_directory");
+    if (c != doc.end() && c->is_string()) cwd = c->get<std::string>();
+
+    for (const json& f : *files) {
+      if (!f.is_object()) return fail(start, "an entry of \"files\" is not an object");
+      auto path = f.find("file");
+      if (path == f.end() || !path->is_string() || path->get<std::string>().empty())
+        return fail(start, "a file entry has no \"file\" name");
+      ImportedFile& file = data.file(absolute(path->get<std::string>(), cwd));
+
+      auto funcs = f.find("functions");
+      if (funcs != f.end()) {
+        if (!funcs->is_array()) return fail(start, "\"functions\" of " + file.path + " is not an array");
+        for (const json& fn : *funcs) {
+          if (!fn.is_object()) return fail(start, "a function entry of " + file.path + " is not an object");
+          std::string fname;
+          for (const char* key : {"demangled_name", "name"}) {
+            auto it = fn.find(key);
+            if (fname.empty() && it != fn.end() && it->is_string()) fname = it->get<std::string>();
+          }
+          std::uint32_t startLine = 0, endLine = 0;
+          std::uint64_t calls = 0;
+          if (fname.empty() || !lineField(fn, "start_line", startLine))
+            return fail(start, "a function of " + file.path + " has no name or start line");
+          lineField(fn, "end_line", endLine);
+          unsignedField(fn, "execution_count", calls);
+          ImportedFunction& func = file.function(fname);
+          if (func.startLine == 0) func.startLine = startLine;
+          if (func.endLine == 0) func.endLine = endLine;
+          func.calls = addCounts(func.calls, calls);
+        }
+      }
+      auto lines = f.find("lines");
+      if (lines != f.end()) {
+        if (!lines->is_array()) return fail(start, "\"lines\" of " + file.path + " is not an array");
+        for (const json& ln : *lines) {
+          std::uint32_t number = 0;
+          std::uint64_t hits = 0;
+          if (!ln.is_object() || !lineField(ln, "line_number", number) || number == 0 ||
+              !unsignedField(ln, "count", hits))
+            return fail(start, "a line entry of " + file.path + " has no line number or count");
+          file.addLine(number, hits);
+        }
+      }
+    }
+    return true;
+  }
+};
+
+}  // namespace
+
+bool readGcovJson(const std::string& name, const std::string& text, ImportedData& data,
+                  ImportError& error) {
+  try {
+    std::vector<std::pair<size_t, size_t>> docs;
+    documents(text, docs);
+    if (docs.empty()) {
+      error = {name, 0, "empty input"};
+      return false;
+    }
+    Reader r{name, text, data, error};
+    for (auto [start, end] : docs)
+      if (!r.document(start, end)) return false;
+    return true;
+  } catch (const std::exception& e) {
+    // Anything the JSON library throws on odd input ends here, never further up.
+    error = {name, 0, std::string("cannot read gcov JSON: ") + e.what()};
+    return false;
+  }
+}

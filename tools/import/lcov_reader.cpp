@@ -1,0 +1,200 @@
+// lcov tracefiles (lcov 1.x and 2.x, llvm-cov's lcov export and the tools that follow them).
+#include <charconv>
+#include <cstring>
+#include <string_view>
+#include <unordered_map>
+
+#include "tools/import/coverage_import.h"
+
+namespace {
+
+struct Parser {
+  const std::string& name;
+  ImportedData& data;
+  ImportError& error;
+  std::uint64_t lineNo = 0;
+  ImportedFile* current = nullptr;
+  // FNL/FNA (lcov 2.2 and later) refer to functions by an index within the record.
+  std::unordered_map<std::uint64_t, std::pair<std::uint32_t, std::uint32_t>> ranges;
+
+  bool fail(const std::string& message) {
+    error.file = name;
+    error.line = lineNo;
+    error.message = message;
+    return false;
+  }
+
+  static bool number(std::string_view s, std::uint64_t& v) {
+    if (s.empty()) return false;
+    if (s[0] == '+') s.remove_prefix(1);
+    auto [p, ec] = std::from_chars(s.data(), s.data() + s.size(), v);
+    if (ec == std::errc::result_out_of_range) {
+      // All digits but too big: the count saturates rather than being refused.
+      for (char c : s)
+        if (c < '0' || c > '9') return false;
+      v = UINT64_MAX;
+      return true;
+    }
+    return ec == std::errc() && p == s.data() + s.size();
+  }
+
+  // Counts may be written as floating point by some tools ("1.5e3"); negative counts are
+  // written by a few as a sign of "not instrumented": both are taken as their whole value
+  // or 0.
+  static bool count(std::string_view s, std::uint64_t& v) {
+    if (number(s, v)) return true;
+    if (!s.empty() && s[0] == '-') {
+      std::uint64_t ignored;
+      if (number(s.substr(1), ignored)) {
+        v = 0;
+        return true;
+      }
+      return false;
+    }
+    std::string text(s);
+    char* end = nullptr;
+    double d = strtod(text.c_str(), &end);
+    if (text.empty() || *end != '\0' || d != d) return false;
+    v = d <= 0 ? 0 : d >= 1.8e19 ? UINT64_MAX : static_cast<std::uint64_t>(d);
+    return true;
+  }
+
+  bool lineNumber(std::string_view s, std::uint32_t& line) {
+    std::uint64_t v;
+    if (!number(s, v) || v > 0x0FFFFFFF) return false;
+    line = static_cast<std::uint32_t>(v);
+    return true;
+  }
+
+  static std::vector<std::string_view> split(std::string_view s, size_t maxParts) {
+    std::vector<std::string_view> parts;
+    while (parts.size() + 1 < maxParts) {
+      size_t comma = s.find(',');
+      if (comma == std::string_view::npos) break;
+      parts.push_back(s.substr(0, comma));
+      s.remove_prefix(comma + 1);
+    }
+    parts.push_back(s);
+    return parts;
+  }
+
+  bool needRecord(std::string_view key) {
+    if (current) return true;
+    return fail(std::string(key) + " before any SF record");
+  }
+
+  bool line(std::string_view text) {
+    if (!text.empty() && text.back() == '\r') text.remove_suffix(1);
+    if (text.empty()) return true;
+    if (text == "end_of_record") {
+      if (!current) return fail("end_of_record without a record");
+      current = nullptr;
+      ranges.clear();
+      return true;
+    }
+    size_t colon = text.find(':');
+    if (colon == std::string_view::npos) return fail("not a tracefile line: '" + std::string(text.substr(0, 80)) + "'");
+    std::string_view key = text.substr(0, colon);
+    std::string_view value = text.substr(colon + 1);
+
+    if (key == "SF") {
+      if (value.empty()) return fail("SF without a file name");
+      current = &data.file(std::string(value));
+      ranges.clear();
+      return true;
+    }
+    if (key == "DA") {
+      if (!needRecord(key)) return false;
+      auto p = split(value, 3);  // line,count[,checksum]
+      std::uint32_t ln;
+      std::uint64_t hits;
+      if (p.size() < 2 || !lineNumber(p[0], ln) || ln == 0 || !count(p[1], hits))
+        return fail("malformed DA record '" + std::string(value) + "'");
+      current->addLine(ln, hits);
+      return true;
+    }
+    if (key == "FN") {
+      if (!needRecord(key)) return false;
+      // FN:line,name (lcov 1.x) or FN:line,endline,name (lcov 2.x). Names may hold commas,
+      // so the three-field form is taken only when the middle field is a number.
+      auto p = split(value, 3);
+      std::uint32_t start = 0, end = 0;
+      if (p.size() < 2 || !lineNumber(p[0], start)) return fail("malformed FN record '" + std::string(value) + "'");
+      std::string fname;
+      if (p.size() == 3 && lineNumber(p[1], end)) {
+        fname = std::string(p[2]);
+      } else {
+        end = 0;
+        fname = std::string(value.substr(p[0].size() + 1));
+      }
+      if (fname.empty()) return fail("FN record without a function name");
+      ImportedFunction& f = current->function(fname);
+      if (f.startLine == 0) f.startLine = start;
+      if (f.endLine == 0) f.endLine = end;
+      return true;
+    }
+    if (key == "FNDA") {
+      if (!needRecord(key)) return false;
+      size_t comma = value.find(',');
+      std::uint64_t calls;
+      if (comma == std::string_view::npos || !count(value.substr(0, comma), calls) || comma + 1 == value.size())
+        return fail("malformed FNDA record '" + std::string(value) + "'");
+      ImportedFunction& f = current->function(std::string(value.substr(comma + 1)));
+      f.calls = addCounts(f.calls, calls);
+      return true;
+    }
+    if (key == "FNL") {
+      if (!needRecord(key)) return false;
+      auto p = split(value, 3);  // index,line[,endline]
+      std::uint64_t index;
+      std::uint32_t start, end = 0;
+      if (p.size() < 2 || !number(p[0], index) || !lineNumber(p[1], start) ||
+          (p.size() == 3 && !lineNumber(p[2], end)))
+        return fail("malformed FNL record '" + std::string(value) + "'");
+      ranges[index] = {start, end};
+      return true;
+    }
+    if (key == "FNA") {
+      if (!needRecord(key)) return false;
+      auto p = split(value, 3);  // index,count,name
+      std::uint64_t index, calls;
+      if (p.size() < 3 || !number(p[0], index) || !count(p[1], calls) || p[2].empty())
+        return fail("malformed FNA record '" + std::string(value) + "'");
+      auto r = ranges.find(index);
+      if (r == ranges.end()) return fail("FNA record for function index " + std::to_string(index) + " without FNL");
+      ImportedFunction& f = current->function(std::string(p[2]));
+      if (f.startLine == 0) f.startLine = r->second.first;
+      if (f.endLine == 0) f.endLine = r->second.second;
+      f.calls = addCounts(f.calls, calls);
+      return true;
+    }
+    // Test names, summaries, version and branch records (and the records newer tools
+    // add) carry nothing we keep; anything that is not a record name is bad input.
+    bool recordName = !key.empty();
+    for (char c : key) recordName = recordName && ((c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') || c == '_');
+    if (recordName) return true;
+    return fail("not a tracefile line: '" + std::string(text.substr(0, 80)) + "'");
+  }
+};
+
+}  // namespace
+
+bool readLcovTracefile(const std::string& name, const std::string& text, ImportedData& data,
+                       ImportError& error) {
+  Parser p{name, data, error, 0, nullptr, {}};
+  size_t pos = 0;
+  while (pos < text.size()) {
+    size_t nl = text.find('\n', pos);
+    size_t end = nl == std::string::npos ? text.size() : nl;
+    ++p.lineNo;
+    std::string_view line(text.data() + pos, end - pos);
+    if (line.find('\0') != std::string_view::npos) return p.fail("binary data in a tracefile");
+    if (!p.line(line)) return false;
+    pos = end + 1;
+  }
+  if (p.current) {
+    ++p.lineNo;
+    return p.fail("the last record has no end_of_record (the file may be truncated)");
+  }
+  return true;
+}
