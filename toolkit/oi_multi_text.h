@@ -144,6 +144,8 @@ class OI_MultiText : public OI_Widget {
   std::function<void(XEvent*)> onPopup;
   // The top line or left column changed.
   std::function<void()> onScroll;
+  // More state for the test hook's dump from whoever draws into the text (one line, no newline).
+  std::function<void(std::ostream&)> describeMore;
 
   void describe(std::ostream& out) const override;
 
@@ -152,6 +154,9 @@ class OI_MultiText : public OI_Widget {
   static constexpr int margin = 2;
 
   // Text actions other code (the outline display) builds on.
+  // Whether Shift+button 1 extends the selection (an outline turns it off).
+  void setExtendSelection(bool on) { extendSelection_ = on; }
+  bool extendSelection() const { return extendSelection_; }
   // Counts a press as the next of a multi-click when it comes within the multi-click time.
   int countClick(XEvent* ev);
   void startSelection(XEvent* ev, int clicks);
@@ -220,6 +225,7 @@ class OI_MultiText : public OI_Widget {
   OI_TextPos anchor_;
   int clickMode_ = 1;  // 1 characters, 2 words, 3 lines
   Time lastPress_ = 0;
+  bool extendSelection_ = true;
   int clicks_ = 0;
   std::string clipboard_;
   std::string primary_;

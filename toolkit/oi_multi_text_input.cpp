@@ -37,7 +37,8 @@ void selectEndAction(Widget w, XEvent* ev, String*, Cardinal*) {
 }
 
 void extendStartAction(Widget w, XEvent* ev, String*, Cardinal*) {
-  if (OI_MultiText* t = textOf(w)) oiGuard("extend_start", [&] { t->adjustSelection(ev); });
+  OI_MultiText* t = textOf(w);
+  if (t && t->extendSelection()) oiGuard("extend_start", [&] { t->adjustSelection(ev); });
 }
 
 void popupAction(Widget w, XEvent* ev, String*, Cardinal*) {
@@ -273,7 +274,9 @@ void OI_MultiText::describe(std::ostream& out) const {
   if (hasSelection())
     out << " selection=" << selectionStart().line << ":" << selectionStart().col << "-" << selectionEnd().line << ":"
         << selectionEnd().col;
-  out << " glyphs=" << glyphs_.size() << " hold=" << hold_ << "\n";
+  out << " glyphs=" << glyphs_.size() << " hold=" << hold_;
+  if (describeMore) describeMore(out);
+  out << "\n";
   for (uint32_t i = 0; i < lineCount() && i < 10000; ++i) out << "  line " << i << ": " << lineText(i) << "\n";
   for (const auto& g : glyphs_)
     if (g->line() != OI_Glyph::noLine) out << "  glyph " << g->name() << " at " << g->line() << ":" << g->column() << "\n";
