@@ -44,10 +44,8 @@ void qrAction(Widget w, XEvent*, String* params, Cardinal* n) {
 }  // namespace
 
 void QR_OI_OutlineDisplay::registerActions() {
-  static bool done = false;
   OI_Application* app = OI_Application::instance();
-  if (done || !app) return;
-  done = true;
+  if (!app || !app->firstTime("QR_OI_OutlineDisplay actions")) return;
   app->addAction("qr_mouse_press", mousePressAction);
   app->addAction("qr_select_motion", selectMotionAction);
   app->addAction("qr_select_release", selectReleaseAction);

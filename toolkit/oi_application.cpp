@@ -5,6 +5,7 @@
 #include <X11/cursorfont.h>
 #include <Xm/Xm.h>
 
+#include <algorithm>
 #include <cstring>
 #include <ctime>
 #include <deque>
@@ -63,6 +64,18 @@ bool OI_TimerHandle::pending() const { return id_ && theApp && theApp->timerPend
 
 OI_Application* OI_Application::instance() { return theApp; }
 
+namespace {
+XtEventDispatchProc keyDispatcher = nullptr;
+XtEventDispatchProc buttonDispatcher = nullptr;
+
+// Every key and button press passes here on its way to its widget: the user is active.
+Boolean noteActivity(XEvent* ev) {
+  if (theApp) theApp->noteUserActivity();
+  XtEventDispatchProc next = ev->type == KeyPress ? keyDispatcher : buttonDispatcher;
+  return next ? next(ev) : False;
+}
+}  // namespace
+
 bool OI_Application::open(int& argc, char** argv, std::string& error, const char* const* fallbacks) {
   if (theApp) return true;
   // The -xrm and related settings are kept to be put over a database installed later.
@@ -97,6 +110,8 @@ bool OI_Application::open(int& argc, char** argv, std::string& error, const char
   app->busyCursor_ = XCreateFontCursor(d, XC_watch);
   app->lastActivity_ = oiNowMs();
   theApp = app;
+  keyDispatcher = XtSetEventDispatcher(d, KeyPress, noteActivity);
+  buttonDispatcher = XtSetEventDispatcher(d, ButtonPress, noteActivity);
   oiInstallTestHook(*app);
   return true;
 }
@@ -157,11 +172,10 @@ void OI_Application::wake() {
 bool OI_Application::quitting() const { return XtAppGetExitFlag(context_); }
 
 void OI_Application::processOne() {
-  XEvent ev;
-  XtAppNextEvent(context_, &ev);
-  if (ev.type == KeyPress || ev.type == ButtonPress) noteUserActivity();
-  XtDispatchEvent(&ev);
+  // One event, timer, input or signal; waits when none is pending.
+  XtAppProcessEvent(context_, XtIMAll);
 }
+
 
 void OI_Application::processPending() {
   XSync(display_, False);
@@ -261,6 +275,12 @@ void OI_Application::addAction(const char* name, XtActionProc proc) {
   names.push_back(name);
   records.push_back(XtActionsRec{oiStr(names.back().c_str()), proc});
   XtAppAddActions(context_, &records.back(), 1);
+}
+
+bool OI_Application::firstTime(const std::string& what) {
+  if (std::find(doneOnce_.begin(), doneOnce_.end(), what) != doneOnce_.end()) return false;
+  doneOnce_.push_back(what);
+  return true;
 }
 
 void OI_Application::applyBusyCursor(Widget shell, bool busy) {

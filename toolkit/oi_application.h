@@ -67,7 +67,7 @@ class OI_Application {
   bool quitting() const;
   // Makes a waiting processOne return (after a timer or signal changed what it waits for).
   void wake();
-  // Handles one event or timer (waiting for one when none is pending).
+  // Handles one event, timer, input or signal (waiting for one when none is pending).
   void processOne();
   // Handles everything now pending, without waiting.
   void processPending();
@@ -83,6 +83,9 @@ class OI_Application {
 
   // Registers an action procedure by name for translation tables.
   void addAction(const char* name, XtActionProc proc);
+  // True the first time it is asked about `what` in this application (one-time set-ups such as
+  // registering a group of actions).
+  bool firstTime(const std::string& what);
 
   // The busy pointer, counted: shown on every top-level window from the first begin, taken away
   // when the count returns to 0.
@@ -114,6 +117,7 @@ class OI_Application {
   int busyCount_ = 0;
   Cursor busyCursor_ = None;
   std::vector<Widget> topLevels_;
+  std::vector<std::string> doneOnce_;
   long long lastActivity_ = 0;
 };
 

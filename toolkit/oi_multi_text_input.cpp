@@ -169,10 +169,8 @@ const char* OI_MultiText::defaultTranslations() {
 }
 
 void OI_MultiText::registerActions() {
-  static bool done = false;
   OI_Application* app = OI_Application::instance();
-  if (done || !app) return;
-  done = true;
+  if (!app || !app->firstTime("OI_MultiText actions")) return;
   app->addAction("select_start", selectStartAction);
   app->addAction("select_adjust", selectAdjustAction);
   app->addAction("select_end", selectEndAction);
