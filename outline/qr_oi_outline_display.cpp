@@ -448,7 +448,7 @@ OI_Glyph* QR_OI_OutlineDisplay::makeGlyph(QR_OutlineAnnotation* a, uint32_t line
 }
 
 void QR_OI_OutlineDisplay::removeGlyphs(QR_OutlineObject* row) {
-  auto range = glyphs_.equal_range(row);
+  auto range = glyphs_.equal_range(static_cast<const QR_Object*>(row));
   for (auto it = range.first; it != range.second; ++it) text_->removeGlyph(it->second.glyph);
   glyphs_.erase(range.first, range.second);
 }
@@ -467,14 +467,14 @@ void QR_OI_OutlineDisplay::row_changed(QR_OutlineObject* row) {
     OI_Glyph* g = makeGlyph(a, first + a->line(), col);
     if (!g) continue;
     g->userData = row;
-    glyphs_.emplace(row, QR_OI_GlyphAnnotation{row, a->name_text(), a->column(), g});
+    glyphs_.emplace(static_cast<const QR_Object*>(row), QR_OI_GlyphAnnotation{row, a->name_text(), a->column(), g});
   }
 }
 
 void QR_OI_OutlineDisplay::annotation_removed(QR_OutlineObject* row, QR_OutlineAnnotation* annotation) {
   if (!row || !annotation) return;
   std::string name = annotation->name_text();
-  auto range = glyphs_.equal_range(row);
+  auto range = glyphs_.equal_range(static_cast<const QR_Object*>(row));
   for (auto it = range.first; it != range.second;) {
     if (it->second.name == name && it->second.annotationColumn == annotation->column()) {
       text_->removeGlyph(it->second.glyph);
@@ -486,10 +486,15 @@ void QR_OI_OutlineDisplay::annotation_removed(QR_OutlineObject* row, QR_OutlineA
 }
 
 void QR_OI_OutlineDisplay::linked_object_destroyed(QR_Object* gone) {
-  auto* row = static_cast<QR_OutlineObject*>(gone);
-  if (menuRow_ == row) menuRow_ = nullptr;
-  if (glyphs_.count(row) && text_->widget()) removeGlyphs(row);
-  glyphs_.erase(row);
+  // The row is half destroyed: it is only compared, never used.
+  if (menuRowKey_ == gone) {
+    menuRow_ = nullptr;
+    menuRowKey_ = nullptr;
+  }
+  auto range = glyphs_.equal_range(gone);
+  for (auto it = range.first; it != range.second; ++it)
+    if (text_->widget()) text_->removeGlyph(it->second.glyph);
+  glyphs_.erase(range.first, range.second);
 }
 
 // ---------------------------------------------------------------- selection

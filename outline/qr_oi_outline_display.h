@@ -119,7 +119,8 @@ class QR_OI_OutlineDisplay : public QR_OutlineDisplay {
   std::vector<uint32_t> marks_;
   std::vector<QR_OI_Enhancement> enhancements_;
   std::map<XrmQuark, std::unique_ptr<QR_OI_Annotation>> images_;
-  std::multimap<QR_OutlineObject*, QR_OI_GlyphAnnotation> glyphs_;
+  // Keyed by the row as a QR_Object, so that a row's end (heard as a QR_Object) finds its glyphs.
+  std::multimap<const QR_Object*, QR_OI_GlyphAnnotation> glyphs_;
   bool autoSelect_ = false;
 
   int updateDepth_ = 0;
@@ -141,4 +142,5 @@ class QR_OI_OutlineDisplay : public QR_OutlineDisplay {
   std::map<std::string, OI_Menu*> glyphMenus_;
   std::vector<std::unique_ptr<OI_Menu>> ownedMenus_;
   QR_OutlineObject* menuRow_ = nullptr;
+  const QR_Object* menuRowKey_ = nullptr;  // the same row, for comparing once it is going
 };

@@ -246,6 +246,8 @@ void QR_OI_OutlineDisplay::popupGlyphMenu(QR_OutlineObject* row, const std::stri
   }
   if (!menu) return;
   menuRow_ = row;
+  menuRowKey_ = row;
+  if (!is_linked(row)) link(row);  // to hear of the row's end while its menu may be up
   for (OI_MenuCell* c : menu->cells()) c->setSensitive(row->has_action(c->name().c_str()));
   menu->popupAt(ev);
 }
