@@ -6,6 +6,7 @@
 #include <X11/Intrinsic.h>
 
 #include <cstdint>
+#include <functional>
 #include <map>
 #include <memory>
 #include <string>
@@ -80,6 +81,9 @@ class QR_OI_OutlineDisplay : public QR_OutlineDisplay {
   void linked_object_destroyed(QR_Object* gone) override;
 
   uint32_t tab_width() const { return tabWidth_; }
+
+  // A double click on a row (for example: open what the row stands for).
+  std::function<void(QR_OutlineObject*)> onActivate;
   int update_depth() const { return updateDepth_; }
 
   // ---- Controlled widgets: menus, popup menus and toolbars whose cells and buttons are named

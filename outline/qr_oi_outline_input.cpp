@@ -134,7 +134,8 @@ void QR_OI_OutlineDisplay::mousePress(XEvent* ev) {
   if (text_->dispatchGlyphPress(ev)) return;
   if (!ev || ev->type != ButtonPress) return;
   clicks_ = text_->countClick(ev);
-  text_->startSelection(ev, 1);
+  // A double click selects the word under the pointer, so that the row under it stays selected.
+  text_->startSelection(ev, clicks_);
   pressed_ = true;
   dragged_ = false;
   pressTime_ = ev->xbutton.time;
@@ -188,6 +189,10 @@ void QR_OI_OutlineDisplay::selectRelease(XEvent* ev) {
     }
   }
   rebuildRowsFromText();
+  if (!dragged_ && clicks_ == 2 && onActivate) {
+    QR_OutlineObject* row = root_->object_at_line(pressLine_);
+    if (row && row->first_line() != QR_OutlineObject::kNoLine) onActivate(row);
+  }
 }
 
 // ---------------------------------------------------------------- glyphs

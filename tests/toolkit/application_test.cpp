@@ -17,6 +17,8 @@
 #include "toolkit/oi_scroll_bar.h"
 #include "toolkit/oi_window.h"
 
+#include <X11/Intrinsic.h>
+
 // The sanitizer build's leak check ignores the X libraries' lifetime caches in this process (the
 // same list as tests/lsan_x11.supp, which the programs the GUI tests start are given).
 extern "C" const char* __lsan_default_suppressions() {
@@ -245,6 +247,50 @@ TEST_F(Toolkit, TextsSharingABarScrollTogetherAndBarsHideWhenEverythingFits) {
   bar->setValue(30);
   EXPECT_EQ(right->text()->topLine(), 30u);
   EXPECT_EQ(left->text()->topLine(), 30u);
+}
+
+TEST_F(Toolkit, AHeadingAndItsTableScrollSidewaysTogether) {
+  QR_OI_Init();
+  shownBox();
+  QR_OI_ScrollTextGang gang(box->widget(), "kgOutlineGang");
+  box->place(gang.widget(), 0, 0, true, true);
+  QR_OI_ScrollText* title = gang.addText("kgTitle", 0, 0, true, false);
+  QR_OI_ScrollText* table = gang.addText("kgOutline", 0, 1, true, true);
+  OI_ScrollBar* bar = gang.addSharedBar(OI_Side::bottom, 0, 1);
+  title->text()->setRows(2);
+  title->text()->setColumns(40);
+  table->text()->setColumns(40);
+  show();
+  title->text()->insertLines(0, {std::string(200, 'h'), std::string(200, 'H')});
+  table->text()->insertLines(0, std::vector<std::string>(5, std::string(200, 'r')));
+  title->text()->redisplay();
+  table->text()->redisplay();
+  EXPECT_TRUE(bar->isManaged());
+  EXPECT_FALSE(bar->vertical());
+  table->text()->setLeftColumn(25);
+  EXPECT_EQ(title->text()->leftColumn(), 25u);
+  // The heading's own vertical bar stays its own.
+  EXPECT_NE(title->scrollBar(OI_Side::right), table->scrollBar(OI_Side::right));
+}
+
+TEST_F(Toolkit, ListsEntryFieldsAndFramesHoldWhatTheyAreGiven) {
+  shownBox();
+  OI_Frame frame(box->widget(), "frame", "Files");
+  box->place(frame.widget(), 0, 0);
+  OI_ScrolledList list(frame.widget(), "list", 4);
+  OI_EntryField entry(box->widget(), "entry", 10);
+  box->place(entry.widget(), 0, 1);
+  show();
+  list.setItems({"a.kgv", "b.kgv", "c.kgv"});
+  EXPECT_EQ(list.items(), (std::vector<std::string>{"a.kgv", "b.kgv", "c.kgv"}));
+  EXPECT_EQ(list.selectedIndex(), -1);
+  list.select(1);
+  EXPECT_EQ(list.selectedIndex(), 1);
+  entry.setText("/tmp/out.kgv");
+  EXPECT_EQ(entry.text(), "/tmp/out.kgv");
+  // The frame's title is a label of its own name.
+  Widget title = XtNameToWidget(frame.widget(), "frameTitle");
+  ASSERT_NE(title, nullptr);
 }
 
 TEST_F(Toolkit, TheCoverKeepsThePictureBelowALineUntilTheChangeIsComplete) {

@@ -281,6 +281,17 @@ TEST_F(ProbeWindow, ADatabaseInstalledByTheProgramGivesWidgetsTheirResources) {
   EXPECT_EQ(s.find("probeText")->number("visible"), 12);
 }
 
+TEST_F(ProbeWindow, WithNoFontNamedTheTextFallsBackToTheCoreFixedFont) {
+  start({"-xrm", "*probeText.fontName:"});
+  const WidgetInfo& t = text();
+  EXPECT_EQ(t.field("cell"), "6x13");
+  Screenshot shot = app->screenshot();
+  int ink = 0;
+  for (int x = t.x + 2; x < t.x + 2 + 6 * 6; ++x)
+    for (int y = t.y + 13; y < t.y + 26; ++y) ink += (shot.at(x, y) & 0xFF) < 0x60;
+  EXPECT_GT(ink, 10) << "no text drawn with the core font";
+}
+
 TEST(ProbeStart, WithoutADisplayTheToolkitSaysWhichOneFailed) {
   ProcessResult r = runProcess({probe(), "-display", ":77777"}, {x11LeakSuppressions()});
   EXPECT_EQ(r.status, 3);

@@ -69,6 +69,10 @@ int main(int argc, char** argv) {
     unsigned long red = outline->text()->namedColor("red", &ok);
     unsigned long yellow = outline->text()->namedColor("yellow", &ok);
     display->add_enhancement("unused", red, yellow);
+    display->onActivate = [title](QR_OutlineObject* row) {
+      const char* t = row->line_text(0);
+      title->text()->setLine(1, std::string("activated ") + (t ? t : ""));
+    };
 
     const char* cells[][2] = {{"QR_OutlineCollapse", "Collapse"},
                               {"QR_OutlineCollapseAll", "Collapse all"},
