@@ -505,6 +505,12 @@ void OI_MultiText::ensureBuffer() {
 }
 
 void OI_MultiText::shiftBuffer(int fromRow, int toRow, int count) {
+  // While held, many changes may come: one full drawing at the release is cheaper than moving
+  // the picture for each of them.
+  if (hold_ > 0) {
+    allDirty_ = true;
+    return;
+  }
   if (!buffer_ || allDirty_ || count <= 0 || fromRow == toRow) {
     if (count > 0 && fromRow != toRow) allDirty_ = true;
     return;
