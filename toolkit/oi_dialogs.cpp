@@ -217,6 +217,13 @@ bool oiAskFileName(Widget parent, const std::string& dialogName, const std::stri
   XtSetArg(args[n], XmNselectionLabelString, static_cast<XmString>(p)), ++n;
   Widget d = XmCreateFileSelectionDialog(parentOrShell(parent), oiStr(dialogName.c_str()), args, n);
   XtUnmanageChild(XmFileSelectionBoxGetChild(d, XmDIALOG_HELP_BUTTON));
+  // In the name field Home and End move in the typed text instead of replacing it with a
+  // name from the list.
+  if (Widget field = XmFileSelectionBoxGetChild(d, XmDIALOG_TEXT)) {
+    XtTranslations t = XtParseTranslationTable(
+        "#override\n<Key>osfBeginLine: beginning-of-line()\n<Key>osfEndLine: end-of-line()\n");
+    if (t) XtOverrideTranslations(field, t);
+  }
   if (!initial.empty()) {
     OI_XmString v(initial);
     XtVaSetValues(d, XmNdirSpec, static_cast<XmString>(v), nullptr);

@@ -7,6 +7,7 @@
 #include <Xm/Label.h>
 #include <Xm/List.h>
 #include <Xm/LabelG.h>
+#include <Xm/Text.h>
 #include <Xm/TextF.h>
 #include <Xm/ToggleB.h>
 #include <Xm/ToggleBG.h>
@@ -75,8 +76,8 @@ void describeWidget(Widget w, std::ostream& out, Display* d) {
     for (int i = 0; i < n; ++i) out << "  item: " << oiXmStringText(items[i]) << "\n";
     return;
   }
-  if (XmIsTextField(w)) {
-    char* v = XmTextFieldGetString(w);
+  if (XmIsTextField(w) || XmIsText(w)) {
+    char* v = XmIsTextField(w) ? XmTextFieldGetString(w) : XmTextGetString(w);
     out << " value=\"" << (v ? v : "") << "\"";
     XtFree(v);
   }

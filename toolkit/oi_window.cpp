@@ -42,6 +42,7 @@ OI_TopLevel::OI_TopLevel(const std::string& name, const std::string& title) {
   XtSetArg(args[2], XmNiconName, const_cast<char*>(title.c_str()));
   Widget shell = XtCreatePopupShell(name.c_str(), topLevelShellWidgetClass, app->shell(), args, 3);
   adopt(shell, name);
+  shell_ = shell;
   main_ = XmCreateMainWindow(shell, oiStr("mainWindow"), nullptr, 0);
   XtManageChild(main_);
   Atom del = XmInternAtom(XtDisplay(shell), oiStr("WM_DELETE_WINDOW"), False);
@@ -50,21 +51,14 @@ OI_TopLevel::OI_TopLevel(const std::string& name, const std::string& title) {
   app->addTopLevel(shell);
 }
 
-OI_TopLevel::~OI_TopLevel() {
-  if (widget()) {
-    focusHomes().erase(widget());
-    if (OI_Application* app = OI_Application::instance()) app->removeTopLevel(widget());
-  }
-}
+OI_TopLevel::~OI_TopLevel() { widgetDestroyed(); }
 
 void OI_TopLevel::widgetDestroyed() {
-  OI_Application* app = OI_Application::instance();
-  for (auto it = focusHomes().begin(); it != focusHomes().end();) {
-    if (app && std::find(app->topLevels().begin(), app->topLevels().end(), it->first) == app->topLevels().end())
-      it = focusHomes().erase(it);
-    else
-      ++it;
+  if (shell_) {
+    focusHomes().erase(shell_);
+    if (OI_Application* app = OI_Application::instance()) app->removeTopLevel(shell_);
   }
+  shell_ = nullptr;
   main_ = nullptr;
 }
 

@@ -42,6 +42,7 @@ class OI_TopLevel : public OI_Widget {
  private:
   static void closeCB(Widget, XtPointer, XtPointer);
   static void structureHandler(Widget, XtPointer, XEvent*, Boolean*);
+  Widget shell_ = nullptr;  // kept to unregister the window once Xt destroyed it
   Widget main_ = nullptr;
   OI_MenuBar* menuBar_ = nullptr;
   bool shown_ = false;

@@ -203,12 +203,28 @@ TEST_F(ProbeWindow, DialogsWaitForTheUserAndReturnThePressedButton) {
   clickWidget("probeNote.kgOK");
   ASSERT_TRUE(waitStatus("notes closed"));
 
-  // The file dialog: Cancel answers nothing.
+  // The file dialog: Cancel answers nothing; OK answers the name typed, and Home in the name
+  // field goes to its start rather than to the list's first file.
   clickWidget("probeFile");
   clickWidget("probeOpen");
   ASSERT_TRUE(app->waitViewable("probeFileDialog", &s));
   clickWidget("probeFileDialog.Cancel");
   ASSERT_TRUE(waitStatus("file: cancelled"));
+  clickWidget("probeFile");
+  clickWidget("probeOpen");
+  ASSERT_TRUE(app->waitViewable("probeFileDialog.Text", &s)) << s.raw().substr(0, 300);
+  clickWidget("probeFileDialog.Text");
+  app->key("End");
+  app->xdotool({"type", "data.kgv"});
+  app->key("Home");
+  app->xdotool({"type", "/tmp"});
+  ASSERT_TRUE(app->waitFor([](const GuiState& st) {
+    const WidgetInfo* f = st.find("probeFileDialog.Text");
+    return f && f->field("value").rfind("/tmp", 0) == 0 && f->field("value").find("data.kgv") != std::string::npos;
+  }, &s)) << s.find("probeFileDialog.Text")->field("value");
+  std::string typed = s.find("probeFileDialog.Text")->field("value");
+  clickWidget("probeFileDialog.OK");
+  ASSERT_TRUE(waitStatus("file: " + typed)) << status();
 }
 
 TEST_F(ProbeWindow, GlyphsTakePressesAndButtonThreeOpensThePopupMenu) {
