@@ -1,7 +1,9 @@
-// Adjustments-file locking. The data-file lock functions are not part of the engine yet;
-// until they are, these succeed without locking (as with locking switched off).
+// Adjustments-file locking: the same lock directories as the data files, so other viewers
+// of the same user never read a half-written file.
 #include "adjust/adjustments_lock.h"
 
-ErrorCode lockAdjustmentsFile(const std::string& /*path*/) { return allOK; }
+#include "coverage/kgv_lock.h"
 
-ErrorCode unlockAdjustmentsFile(const std::string& /*path*/) { return allOK; }
+ErrorCode lockAdjustmentsFile(const std::string& path) { return lockKgvFile(path); }
+
+ErrorCode unlockAdjustmentsFile(const std::string& path) { return unlockKgvFile(path); }

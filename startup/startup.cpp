@@ -8,6 +8,8 @@
 #include <cstring>
 
 #include "startup/diagnostic.h"
+#include "startup/load_files.h"
+#include "startup/merge_mode.h"
 #include "settings/settings_startup.h"
 #include "startup/runtime_options.h"
 #include "startup/settings_wiring.h"
@@ -192,7 +194,15 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
   // Load step 8: the list of distinct files.
   s.loadedFiles = buildFileList(s.fileArgs);
 
-  // The loading of data comes with the data engine.
+  if (s.mode == RunMode::merge) return runMergeMode(s);
+
+  // Load steps 6, 7, 9 and 10: lock, load and merge every file.
+  std::unique_ptr<KgvData> data;
+  std::vector<std::string> ignored;
+  ErrorCode loadStatus = loadStartupFiles(s, data, ignored);
+  if (loadStatus != allOK && loadStatus != mergeIgnored) return loadStatus;
+
+  // The summary and what follows it come next.
   reportError(notImplemented, "%s", errorMessage(notImplemented).c_str());
   return notImplemented;
 }

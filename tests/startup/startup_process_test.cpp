@@ -5,6 +5,7 @@
 
 #include <regex>
 
+#include "coverage/kgv_file.h"
 #include "tests/support/test_support.h"
 
 using kgtest::runProcess;
@@ -205,4 +206,32 @@ TEST(ProductCommand, AnInstalledCopyFindsItsInstallationDirectory) {
   std::string dir = prefix.path() + "/share/kestrelgauge";
   EXPECT_NE(r.err.find("   Installed in:         " + dir + "\n"), std::string::npos) << r.err;
   EXPECT_TRUE(kgtest::fileExists(dir + "/scripts/file-coverage"));
+}
+
+TEST(MergeCommand, AccumulatesRunsIntoOneOfItsInputs) {
+  kgtest::TempDir dir;
+  std::string run = "record src/a.c build=100 first=1700000000 last=1700000100\n"
+                    "function main line=3 calls=1\nblock 4 hits=2\n";
+  kgtest::writeFile(dir.file("run.txt"), run);
+  ASSERT_EQ(runProcess({kgtest::binPath("kgv-make"), dir.file("run.txt"), dir.file("all.kgv")}).status, 0);
+  ASSERT_EQ(runProcess({kgtest::binPath("kgv-make"), dir.file("run.txt"), dir.file("new.kgv")}).status, 0);
+  auto r = runProcess({kestrel(), "-merge=all.kgv", "all.kgv", "new.kgv"}, plainEnv(), "", dir.path());
+  EXPECT_EQ(r.status, 0) << r.err;
+  EXPECT_EQ(r.err, "");
+  // Merging once more adds the new run again: sessions and hits keep adding up.
+  r = runProcess({kestrel(), "-merge=all.kgv", "all.kgv", "new.kgv", "-locking=no"}, plainEnv(), "",
+                 dir.path());
+  EXPECT_EQ(r.status, 0) << r.err;
+  EXPECT_FALSE(kgtest::fileExists(dir.file(".lock.quor.all.kgv")));
+  std::unique_ptr<KgvData> merged;
+  ASSERT_EQ(readKgvFile(dir.file("all.kgv"), merged), allOK);
+  ASSERT_EQ(merged->records.size(), 1u);
+  EXPECT_EQ(merged->records[0]->counts[0], 3u);  // sessions
+  EXPECT_EQ(merged->records[0]->counts.back(), 6u);  // block hits
+  // A missing input fails with its code and leaves the target alone.
+  std::string before = kgtest::readFile(dir.file("all.kgv"));
+  r = runProcess({kestrel(), "-merge=all.kgv", "all.kgv", "gone.kgv"}, plainEnv(), "", dir.path());
+  EXPECT_EQ(r.status, 18);
+  EXPECT_EQ(r.err.rfind("Kestrelgauge: Can't load file gone.kgv.\n", 0), 0u) << r.err;
+  EXPECT_EQ(kgtest::readFile(dir.file("all.kgv")), before);
 }

@@ -1,0 +1,27 @@
+// Loading data files under their locks and merging them, file after file, into one body.
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "adjust/errors.h"
+#include "coverage/kgv_data.h"
+#include "coverage/kgv_file_ref.h"
+
+// Locks the file named by the reference's given name, reads it, unlocks it; on success the
+// reference's loadTime becomes the current time.
+ErrorCode loadKgvFile(KgvFileRef& ref, std::unique_ptr<KgvData>& out);
+
+// Loads and merges every file in order. 1, 36 when data were set aside, else the first
+// failure's code with failedIndex set to the failing file (0-based); 9 for an empty list.
+// The first file's isJava becomes the process-wide isJava. On success fileCount is the
+// number of files.
+ErrorCode loadAllKgvFiles(std::vector<KgvFileRef>& files, std::uint32_t mergeMode,
+                          std::vector<std::string>* ignored, std::unique_ptr<KgvData>& out,
+                          std::size_t& fileCountOrFailedIndex);
+
+// The isJava field of the first file of the last load of all files.
+bool kgvIsJava();
+void setKgvIsJava(bool isJava);
