@@ -14,7 +14,7 @@ PKGS := g++ cmake pkg-config ca-certificates \
         xvfb xdotool x11-apps x11-utils imagemagick xfonts-base fonts-dejavu-core \
         lcov time
 
-.PHONY: all deps configure build demo test test-release test-asan bench clean
+.PHONY: all deps configure build demo test test-release test-asan bench lcov-check clean
 
 all: build
 
@@ -56,6 +56,11 @@ test: test-release test-asan
 
 bench: build
 	@for b in bench/*.sh; do [ -f "$$b" ] && bash "$$b" $(BUILD) || exit 1; done
+	@for b in $(BUILD)/bench/*_bench; do [ -x "$$b" ] && "$$b" || exit 1; done
+
+# kestrel's figures against lcov's on real coverage, with timings of both.
+lcov-check: build
+	@bash bench/lcov_check.sh $(BUILD)
 
 clean:
 	rm -rf $(BUILD) $(ASAN_BUILD)

@@ -1,24 +1,22 @@
 #!/usr/bin/env bash
-# The main job of `make demo`: the product command on the bundled demo data, on the
-# user's display or under a private Xvfb with a screenshot.
+# The main job of `make demo`: the bundled demo program's real coverage, built with gcc
+# --coverage and imported from gcov, with the adjustments its source markers carry.
 set -u
 build=${1:-build}
-kestrel="$build/bin/kestrel"
 here=$(cd "$(dirname "$0")" && pwd)
+kestrel="$build/bin/kestrel"
 
-run() {
-  "$kestrel" -view -version
-}
+kgv=$("$here/build-demo.sh" "$build") || exit 1
+demo=$(dirname "$kgv")
+adjust="-adjustmentfilename=$demo/demo.adjust"
 
-if [ -n "${DISPLAY:-}" ]; then
-  run
-else
-  shot="$build/demo-screenshot.png"
-  "$here/xvfb-run-here.sh" bash -c '
-    "$1" -view -version; status=$?
-    import -window root "$2" 2>/dev/null || xwd -root | convert xwd:- "$2"
-    exit $status' _ "$kestrel" "$shot"
-  status=$?
-  echo "Screenshot: $shot"
-  exit $status
-fi
+echo "== Adjustments from the demo's source markers"
+"$kestrel" -extract "$adjust" "$kgv" || exit 1
+echo
+echo "== Coverage per file (adjusted)"
+"$kestrel" -export "$adjust" "$kgv" | "$build/scripts/file-coverage"
+echo
+echo "== Unused lines"
+"$kestrel" -export "$adjust" "$kgv" | "$build/scripts/unused-lines"
+echo
+echo "Data file: $kgv"

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "coverage/kgv_file.h"
+#include "coverage/kgv_lock.h"
 #include "tools/import/coverage_import.h"
 #include "tools/import/import_records.h"
 
@@ -58,7 +59,13 @@ int main(int argc, char** argv) {
 
   auto now = static_cast<std::uint32_t>(time(nullptr));
   auto kgv = makeImportedData(data, now);
-  ErrorCode rc = writeKgvFile(out, *kgv);
-  if (rc != allOK) return fail("cannot write " + out + ": " + errorMessage(rc));
+  // Other programs may be reading or merging into the same file: write under its lock.
+  ErrorCode rc = lockKgvFile(out);
+  if (rc == allOK) {
+    rc = writeKgvFile(out, *kgv);
+    ErrorCode unlocked = unlockKgvFile(out);
+    if (rc == allOK) rc = unlocked;
+  }
+  if (rc != allOK) return fail("cannot write " + out + ":\n" + errorMessage(rc));
   return 0;
 }

@@ -1,0 +1,115 @@
+// The text model and the toolkit's plain helpers, without a display.
+#include <gtest/gtest.h>
+
+#include "toolkit/oi_dialogs.h"
+#include "toolkit/oi_menu.h"
+#include "toolkit/oi_text_model.h"
+
+namespace {
+
+TEST(TextModel, SourceTextInAnyEncodingKeepsEveryByteVisible) {
+  // UTF-8 stays as it is; a stray Latin-1 byte (an EUC or ISO-8859 file) becomes its own character.
+  std::u32string u = oiDecodeUtf8("caf\xc3\xa9 \xe6\x97\xa5");
+  EXPECT_EQ(u, U"caf\u00e9 \u65e5");
+  std::u32string bad = oiDecodeUtf8("a\xe9z\xc0\xaf\xed\xa0\x80");
+  ASSERT_EQ(bad.size(), 8u);  // a, é, z, then the overlong pair and the surrogate byte by byte
+  EXPECT_EQ(bad[1], U'\u00e9');
+  EXPECT_EQ(bad[3], U'\u00c0');
+  EXPECT_EQ(oiEncodeUtf8(oiDecodeUtf8("caf\xc3\xa9")), "caf\xc3\xa9");
+  // A sequence cut off at the end of the text.
+  EXPECT_EQ(oiDecodeUtf8("ok\xe6\x97").size(), 4u);
+}
+
+TEST(TextModel, RowsChangeOnlyAfterTheirCommonBeginning) {
+  OI_TextModel m;
+  m.insertLines(0, {"Total Coverage   12   50%", "dir/  3"});
+  m.setAttributes(0, 0, 5, OI_CharAttr{OI_attrHeading, 0, 0});
+  m.replaceTail(0, 17, U"13   52%");
+  EXPECT_EQ(m.lineText(0), "Total Coverage   13   52%");
+  // The untouched beginning keeps its attributes; the new tail has plain ones.
+  EXPECT_EQ(m.attrAt(0, 2).flags, OI_attrHeading);
+  EXPECT_EQ(m.attrAt(0, 20).flags, 0);
+  // A shorter new line drops what remains of the old one.
+  m.replaceTail(1, 4, U"");
+  EXPECT_EQ(m.lineText(1), "dir/");
+  m.overwrite(1, 6, U"=>");
+  EXPECT_EQ(m.lineText(1), "dir/  =>");
+  // Places past the end are ignored rather than growing the text.
+  m.setLine(7, "nowhere");
+  m.replaceTail(9, 0, U"x");
+  EXPECT_EQ(m.lineCount(), 2u);
+}
+
+TEST(TextModel, LongestLineFollowsInsertionsAndDeletions) {
+  OI_TextModel m;
+  m.insertLines(0, {"short", "a much longer line", "mid length"});
+  EXPECT_EQ(m.maxLineLength(), 18u);
+  m.deleteLines(1, 1);
+  EXPECT_EQ(m.maxLineLength(), 10u);
+  m.setLine(0, "x");
+  EXPECT_EQ(m.maxLineLength(), 10u);
+  m.deleteLines(0, 99);
+  EXPECT_EQ(m.maxLineLength(), 0u);
+  EXPECT_EQ(m.lineCount(), 0u);
+}
+
+TEST(TextModel, SelectionStaysOnItsTextWhileLinesComeAndGo) {
+  OI_TextModel m;
+  m.insertLines(0, {"zero", "one", "two", "three", "four"});
+  m.setSelection({3, 0}, {1, 1});  // given backwards
+  EXPECT_EQ(m.selectionStart(), (OI_TextPos{1, 1}));
+  EXPECT_EQ(m.selectedText(), "ne\ntwo\n");
+  m.insertLines(0, {"new"});
+  EXPECT_EQ(m.selectedText(), "ne\ntwo\n");
+  m.deleteLines(0, 2);  // "new" and "zero"; the selection's first line survives
+  EXPECT_EQ(m.selectionStart(), (OI_TextPos{0, 1}));
+  EXPECT_TRUE(m.isSelected(1, 0));
+  EXPECT_FALSE(m.isSelected(2, 0));
+  m.clearSelection();
+  EXPECT_EQ(m.selectedText(), "");
+}
+
+TEST(TextModel, DoubleClickWordsStopAtPunctuation) {
+  OI_TextModel m;
+  m.insertLines(0, {"call foo_bar(x);"});
+  OI_TextPos s, e;
+  m.wordAround({0, 7}, s, e);
+  EXPECT_EQ(s.col, 5u);
+  EXPECT_EQ(e.col, 12u);
+  m.wordAround({0, 12}, s, e);  // "(" alone
+  EXPECT_EQ(e.col - s.col, 1u);
+}
+
+TEST(ToolkitText, AcceleratorResourcesBecomeKeysAndLabels) {
+  std::string accel, text;
+  ASSERT_TRUE(oiParseAccelerator("Ctrl<Key>O: fire()", accel, text));
+  EXPECT_EQ(accel, "Ctrl<Key>O");
+  EXPECT_EQ(text, "Ctrl+O");
+  ASSERT_TRUE(oiParseAccelerator("  Mod1<Key>t:fire()", accel, text));
+  EXPECT_EQ(text, "Alt+t");
+  EXPECT_FALSE(oiParseAccelerator("fire()", accel, text));
+  EXPECT_FALSE(oiParseAccelerator("Ctrl<Key>: fire()", accel, text));
+}
+
+TEST(ToolkitText, ErrorTextsWrapAtSixtyColumns) {
+  std::string msg =
+      "The coverage data file could not be read because its header names a version this viewer does not know";
+  std::string wrapped = oiWrapText(msg, 60);
+  size_t start = 0;
+  while (start < wrapped.size()) {
+    size_t nl = wrapped.find('\n', start);
+    size_t len = (nl == std::string::npos ? wrapped.size() : nl) - start;
+    EXPECT_LE(len, 60u);
+    if (nl == std::string::npos) break;
+    start = nl + 1;
+  }
+  std::string rejoined = wrapped;
+  for (char& c : rejoined)
+    if (c == '\n') c = ' ';
+  EXPECT_EQ(rejoined, msg);
+  // Existing line breaks stay; a word longer than the width stands on its own line.
+  EXPECT_EQ(oiWrapText("a\nb", 60), "a\nb");
+  EXPECT_EQ(oiWrapText("x " + std::string(70, 'y') + " z", 60), "x\n" + std::string(70, 'y') + "\nz");
+}
+
+}  // namespace
