@@ -57,8 +57,8 @@ check() {
 status=0
 check "$work/demo.info" "demo program" || status=1
 
-# A large tracefile: the demo's records under 1000 other paths each.
-awk -v copies=1000 '
+# A large tracefile: the demo's records under 5000 other paths each.
+awk -v copies=5000 '
   { rec = rec $0 "\n" }
   /^end_of_record/ { recs[n++] = rec; rec = "" }
   END { for (c = 0; c < copies; c++) for (i = 0; i < n; i++) {
