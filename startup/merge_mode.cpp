@@ -5,8 +5,6 @@
 #include "coverage/kgv_lock.h"
 #include "startup/load_files.h"
 
-namespace {
-
 void reportOutOfDate(const std::vector<std::string>& ignored) {
   if (ignored.empty()) {
     reportError(mergeIgnored, "%s", errorMessage(mergeIgnored).c_str());
@@ -17,8 +15,6 @@ void reportOutOfDate(const std::vector<std::string>& ignored) {
   for (const auto& name : ignored) text += "\n" + name;
   reportError(mergeIgnored, "%s", text.c_str());
 }
-
-}  // namespace
 
 ErrorCode runMergeMode(StartupState& s) {
   const std::string& target = s.mergeTarget;

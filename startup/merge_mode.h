@@ -2,6 +2,9 @@
 // writes the result to OUT, which may be one of the files.
 #pragma once
 
+#include <string>
+#include <vector>
+
 #include "adjust/errors.h"
 #include "startup/startup.h"
 
@@ -11,3 +14,7 @@
 // and are no failure: the result is 1 then. Failures are reported on the console and
 // returned.
 ErrorCode runMergeMode(StartupState& s);
+
+// The note on standard error that data were set aside as out of date, naming the source
+// files concerned (the other modes that load data report it the same way).
+void reportOutOfDate(const std::vector<std::string>& ignored);

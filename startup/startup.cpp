@@ -3,11 +3,18 @@
 
 #include <sys/utsname.h>
 
+#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 
+#include "adjust/adjustment_list.h"
+#include "adjust/adjustments_file.h"
+#include "coverage/summary_build.h"
+#include "coverage/summary_sort.h"
 #include "startup/diagnostic.h"
+#include "startup/export_mode.h"
+#include "startup/extract_mode.h"
 #include "startup/load_files.h"
 #include "startup/merge_mode.h"
 #include "settings/settings_startup.h"
@@ -196,13 +203,87 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
 
   if (s.mode == RunMode::merge) return runMergeMode(s);
 
-  // Load steps 6, 7, 9 and 10: lock, load and merge every file.
-  std::unique_ptr<KgvData> data;
-  std::vector<std::string> ignored;
-  ErrorCode loadStatus = loadStartupFiles(s, data, ignored);
-  if (loadStatus != allOK && loadStatus != mergeIgnored) return loadStatus;
+  StartupSummary prepared;
+  ErrorCode rc = prepareStartupSummary(s, prepared);
+  if (rc != allOK && rc != mergeIgnored) return rc;
 
-  // The summary and what follows it come next.
+  if (s.mode == RunMode::exportReport) return runExportMode(prepared);
+  if (s.mode == RunMode::extract) return runExtractMode(prepared);
+
+  // The main window takes over from here once it exists.
   reportError(notImplemented, "%s", errorMessage(notImplemented).c_str());
   return notImplemented;
+}
+
+ErrorCode startupSortOrder(const std::vector<ViewerOption>& options, std::uint32_t& order) {
+  order = 0;
+  if (const ViewerOption* o = findGivenOption("sort", options)) {
+    ErrorCode rc = parseSortOrder(o->value.c_str(), order);
+    if (rc != allOK) {
+      reportError(invalidSortingOrder, "Couldn't interpret %s as a sorting order.\n",
+                  o->value.c_str());
+      return invalidSortingOrder;
+    }
+  }
+  if (order < 1 || order > 17) order = static_cast<std::uint32_t>(defaultSortOrder());
+  if (order < 1 || order > 17) order = 11;
+  return allOK;
+}
+
+ErrorCode applyHelpMaxWait(const std::vector<ViewerOption>& options) {
+  const ViewerOption* o = findGivenOption("QUOR_HELP_MAX_WAIT", options);
+  if (!o || o->value.empty()) return allOK;
+  const char* text = o->value.c_str();
+  char* end = nullptr;
+  errno = 0;
+  long value = strtol(text, &end, 0);
+  if (end == text || *end != '\0') {
+    reportError(argError, "Option %s=%s must have a numeric value.", o->name.c_str(), text);
+    return argError;
+  }
+  setOption(QUOR_HELP_MAX_WAIT, static_cast<std::intptr_t>(value));
+  return allOK;
+}
+
+void reportAdjustmentProblems(const std::vector<std::string>& problems) {
+  if (problems.empty()) return;
+  std::string text = "Problems reading adjustments:";
+  for (const auto& p : problems) text += "\n" + p;
+  reportError(errorOccured, "%s", text.c_str());
+}
+
+ErrorCode prepareStartupSummary(StartupState& s, StartupSummary& out) {
+  // Load steps 6, 7, 9 and 10: lock, load and merge every file.
+  out.loadStatus = loadStartupFiles(s, out.data, out.ignored);
+  if (out.loadStatus != allOK && out.loadStatus != mergeIgnored) return out.loadStatus;
+
+  // 10. Java texts.
+  if (s.isJava) mergeJavaResourceFiles(s.installDir);
+
+  // 11. Sort order.
+  ErrorCode rc = startupSortOrder(s.options, out.sortOrder);
+  if (rc != allOK) return rc;
+
+  // 12. How long help may take to come up.
+  applyHelpMaxWait(s.options);
+
+  // 13. The adjustments file; its problems are shown later, not fatal.
+  const ViewerOption* adj = findGivenOption("adjustmentfilename", s.options);
+  out.adjustmentProblems = readStartupAdjustments(adj ? adj->value.c_str() : nullptr);
+
+  // 14. Hits policy.
+  out.hitsPolicy = getHitsPolicy();
+
+  // 15. The summary.
+  // The report alone reads each file's line states once: they are made as it goes, except
+  // when damaged line numbers are to be reported before anything else.
+  bool lineStatesLater =
+      s.mode == RunMode::exportReport && std::getenv("PROCESS_CORRUPTED_LINES") == nullptr;
+  rc = buildSummary(*out.data, out.sortOrder, out.hitsPolicy, adjustmentList(), out.summary,
+                    !lineStatesLater);
+  if (rc != allOK) {
+    reportError(rc, "Couldn't summarize information:\n%s\n", errorMessage(rc).c_str());
+    return rc;
+  }
+  return out.loadStatus;
 }

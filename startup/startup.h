@@ -2,11 +2,14 @@
 #pragma once
 
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <vector>
 
 #include "adjust/errors.h"
+#include "coverage/kgv_data.h"
 #include "coverage/kgv_file_ref.h"
+#include "coverage/summary_types.h"
 #include "startup/viewer_options.h"
 
 enum class RunMode { view, exportReport, merge, extract };
@@ -32,6 +35,33 @@ struct StartupState {
 std::vector<KgvFileRef> buildFileList(const std::vector<std::string>& fileArgs);
 
 StartupState& startupState();
+
+// What the loading and summary steps hand to the mode that follows.
+struct StartupSummary {
+  std::unique_ptr<KgvData> data;
+  std::vector<std::string> ignored;  // source files whose older data were set aside
+  ErrorCode loadStatus = allOK;      // 1, or 36 when data were set aside
+  std::uint32_t sortOrder = 0;
+  std::uint32_t hitsPolicy = 1;
+  std::vector<std::string> adjustmentProblems;
+  std::unique_ptr<SumRoot> summary;  // refers into data
+};
+
+// After the file list is built: loads and merges the files, then the sort order, the help
+// wait, the adjustments file, the hits policy and the summary. Fatal problems are reported
+// on the console and their code returned; on success the result is 1 or 36.
+ErrorCode prepareStartupSummary(StartupState& s, StartupSummary& out);
+
+// The sort order of the option `sort` when given, else the settings' default. An unknown
+// name is reported ("Couldn't interpret %s as a sorting order.") and gives 42.
+ErrorCode startupSortOrder(const std::vector<ViewerOption>& options, std::uint32_t& order);
+
+// A value given for QUOR_HELP_MAX_WAIT goes to the runtime option when it is a number;
+// otherwise the value is reported (code 6) and start-up goes on. Returns the code.
+ErrorCode applyHelpMaxWait(const std::vector<ViewerOption>& options);
+
+// "Problems reading adjustments:" and the messages, on standard error; nothing when empty.
+void reportAdjustmentProblems(const std::vector<std::string>& problems);
 
 // The version banner: product, version, build date and platform, then the two directories.
 std::string versionBanner(const StartupState& s);

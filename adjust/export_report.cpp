@@ -1,0 +1,281 @@
+// Writing the export report through one buffered, guarded writer: after the first failed
+// write nothing more is written, and a closed pipe counts as success.
+#include "adjust/export_report.h"
+
+#include <cerrno>
+#include <cstring>
+#include <memory>
+#include <new>
+#include <string_view>
+
+#include "adjust/adjustment_list.h"
+#include "coverage/summary_build.h"
+#include "startup/atomic_write.h"
+
+namespace {
+
+constexpr std::uint32_t kSaturation = 10000;
+
+const char* const kKeyLines[] = {
+    "",
+    " Summary of keys and field meanings:",
+    "",
+    " to unused-blocks blocks unused-lines lines unused-funcs funcs files dirs",
+    " di name unused-blocks blocks unused-lines lines unused-funcs funcs files",
+    " fi name unused-blocks blocks unused-lines lines unused-funcs funcs sessions",
+    " fu name unused-blocks blocks unused-lines lines calls",
+    " li line_no hits",
+    " bl line_no hits",
+    " efu name",
+    " efi name",
+    " edi name",
+    "",
+    " In all of these entries, the character separating the values is a TAB, not",
+    " a space.",
+    "",
+    " Values for hits, calls, and sessions stop accumulating once they reach",
+    nullptr,  // the line with the three limits
+    "",
+    " 'to'  -- Total coverage summary.",
+    " 'di'  -- Coverage summary for one directory, followed by the files in the",
+    "          directory.  Repeated for each directory.",
+    " 'edi' -- End of information for named directory.",
+    " 'fi'  -- Coverage summary for one file, followed by the functions in the",
+    "          file.  Repeated for each file within a directory.",
+    " 'efi' -- End of information for named file.",
+    " 'fu'  -- Coverage summary for one function, followed by line and block",
+    "          coverage information for the function.  Repeated for each function",
+    "          within the file.",
+    " 'efu' -- End of information for named function.",
+    " 'li'  -- Use count for the indicated line.  Repeated for each line in the",
+    "          function.  If coverage adjustments are NOT applied, then the",
+    "          hits figure is the true hits figure for the line.  If coverage",
+    "          adjustments ARE applied, then inspected and tested lines will",
+    "          indicate INSP or TEST as appropriate, while other used and unused",
+    "          lines will indicate their counts.  Deadcode lines do not appear",
+    "          in export format when adjustments are applied.",
+    " 'bl'  -- Use count for the basic block.  Repeated for each block in the",
+    "          function.  Note that a single line may contain multiple blocks,",
+    "          and that a single block may span multiple lines.",
+};
+
+const char kDigitPairs[] =
+    "00010203040506070809101112131415161718192021222324252627282930313233343536373839"
+    "40414243444546474849505152535455565758596061626364656667686970717273747576777879"
+    "8081828384858687888990919293949596979899";
+
+std::uint32_t saturate(std::uint32_t v) { return v > kSaturation ? kSaturation : v; }
+
+// Collects output in a buffer and hands it to the stream in large writes. The first failed
+// write sets the flag; everything after it is dropped.
+class GuardedWriter {
+ public:
+  explicit GuardedWriter(FILE* stream) : stream_(stream), buf_(new char[kSize]) { errno = 0; }
+
+  GuardedWriter& text(std::string_view s) {
+    if (s.size() > kSize - used_) {
+      flush();
+      if (s.size() > kSize) {
+        writeOut(s.data(), s.size());
+        return *this;
+      }
+    }
+    std::memcpy(buf_.get() + used_, s.data(), s.size());
+    used_ += s.size();
+    return *this;
+  }
+  GuardedWriter& text(const char* s) { return text(std::string_view(s)); }
+  GuardedWriter& tab() { return ch('\t'); }
+  // Two digits at a time: most numbers of a report are small line numbers and counts.
+  GuardedWriter& number(std::uint32_t v) {
+    if (kSize - used_ < 16) flush();
+    std::size_t n = 1;
+    for (std::uint32_t rest = v; rest >= 10; rest /= 10) ++n;
+    char* q = buf_.get() + used_ + n;
+    used_ += n;
+    while (v >= 100) {
+      q -= 2;
+      q[0] = kDigitPairs[2 * (v % 100)];
+      q[1] = kDigitPairs[2 * (v % 100) + 1];
+      v /= 100;
+    }
+    if (v < 10) {
+      q[-1] = static_cast<char>('0' + v);
+    } else {
+      q[-2] = kDigitPairs[2 * v];
+      q[-1] = kDigitPairs[2 * v + 1];
+    }
+    return *this;
+  }
+  // Ends a line; the buffer goes out once it is nearly full.
+  void endLine() {
+    ch('\n');
+    if (used_ >= kFlushAt) flush();
+  }
+
+  void flush() {
+    writeOut(buf_.get(), used_);
+    used_ = 0;
+  }
+
+  ErrorCode finish() {
+    flush();
+    if (!failed_ && std::fflush(stream_) != 0) fail();
+    if (!failed_) return allOK;
+    if (savedErrno_ == EPIPE) {
+      clearPendingSystemError();
+      return allOK;
+    }
+    return fileWriteFailed;
+  }
+
+  bool failed() const { return failed_; }
+
+ private:
+  static constexpr std::size_t kSize = 1 << 17;
+  static constexpr std::size_t kFlushAt = kSize - 4096;
+
+  GuardedWriter& ch(char c) {
+    if (used_ == kSize) flush();
+    buf_[used_++] = c;
+    return *this;
+  }
+  void writeOut(const char* data, std::size_t n) {
+    if (failed_ || n == 0) return;
+    if (std::fwrite(data, 1, n, stream_) != n) fail();
+  }
+  void fail() {
+    failed_ = true;
+    savedErrno_ = errno != 0 ? errno : EIO;
+    recordSystemError(savedErrno_);
+  }
+
+  FILE* stream_;
+  std::unique_ptr<char[]> buf_;
+  std::size_t used_ = 0;
+  bool failed_ = false;
+  int savedErrno_ = 0;
+};
+
+void writeHeader(GuardedWriter& w, std::time_t when) {
+  std::string hashes(79, '#');
+  w.text(hashes).endLine();
+  char date[64] = "";
+  struct tm local {};
+  if (localtime_r(&when, &local)) strftime(date, sizeof date, "%d-%h-%Y %r", &local);
+  char line[160];
+  snprintf(line, sizeof line, "# This is a Kestrelgauge export file, created %-31s #", date);
+  w.text(line).endLine();
+  snprintf(line, sizeof line, "# Coverage data type: %-55s #", "adjusted.");
+  w.text(line).endLine();
+  for (const char* key : kKeyLines) {
+    char limits[96];
+    if (!key) {
+      snprintf(limits, sizeof limits, " %5d, so a value of %5d should be taken as %5d or greater.",
+               int(kSaturation), int(kSaturation), int(kSaturation));
+      key = limits;
+    }
+    snprintf(line, sizeof line, "#%-77s#", key);
+    w.text(line).endLine();
+  }
+  w.text(hashes).endLine();
+}
+
+void writeFunction(GuardedWriter& w, const SumFile& file, const std::vector<LineState>& states,
+                   const SumFunc& fn) {
+  w.text("fu\t").text(fn.name).tab().number(fn.counts.unusedBlocks).tab().number(fn.counts.blocks);
+  w.tab().number(fn.counts.adjUnusedLines).tab().number(fn.counts.adjLines);
+  w.tab().number(saturate(fn.calls));
+  w.endLine();
+  const ObjRecord* rec = file.record;
+  if (rec) {
+    std::size_t last = std::min<std::size_t>(fn.lastMapIndex, rec->map.size() - 1);
+    for (std::size_t i = fn.firstMapIndex; !rec->map.empty() && i <= last; ++i) {
+      if (mapTag(rec->map[i]) != TagBlock) continue;
+      std::uint32_t hits = i < rec->counts.size() ? rec->counts[i] : 0;
+      w.text("bl\t").number(mapValue(rec->map[i])).tab().number(saturate(hits));
+      w.endLine();
+    }
+  }
+  if (fn.firstLine != 0) {
+    std::uint32_t last = std::min<std::uint32_t>(fn.lastLine, std::uint32_t(states.size()));
+    for (std::uint32_t l = fn.firstLine; l <= last; ++l) {
+      const LineState& s = states[l - 1];
+      if (!(s.flags & LineHasCode)) continue;
+      if ((s.flags & kAdjustMask) && lineUnusedDead(s.flags, s.count)) continue;
+      w.text("li\t").number(l).tab();
+      if (s.count != 0) {
+        w.number(saturate(s.count));
+      } else {
+        w.text(exportCountText(true, s.flags, s.count));
+      }
+      w.endLine();
+    }
+  }
+  w.text("efu\t").text(fn.name).endLine();
+}
+
+}  // namespace
+
+ErrorCode writeExport(FILE* stream, const SumRoot& root) {
+  return writeExport(stream, root, std::time(nullptr));
+}
+
+namespace {
+
+ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when) {
+  LazyLineStates lineStates(adjustmentList(), root.hitsPolicy);
+  GuardedWriter w(stream);
+  writeHeader(w, when);
+  const SumCounts& t = root.counts;
+  w.text("to\t").number(t.unusedBlocks).tab().number(t.blocks).tab().number(t.adjUnusedLines);
+  w.tab().number(t.adjLines).tab().number(root.unusedFuncs).tab().number(root.funcs);
+  w.tab().number(root.files).tab().number(root.dirs);
+  w.endLine();
+  for (const SumDir* d : root.dirOrder) {
+    if (w.failed()) break;
+    const SumCounts& c = d->counts;
+    w.text("di\t").text(d->name).tab().number(c.unusedBlocks).tab().number(c.blocks);
+    w.tab().number(c.adjUnusedLines).tab().number(c.adjLines).tab().number(d->unusedFuncs);
+    w.tab().number(d->funcs).tab().number(d->files);
+    w.endLine();
+    for (const SumFile* f : d->fileOrder) {
+      if (w.failed()) break;
+      const SumCounts& fc = f->counts;
+      w.text("fi\t").text(f->name).tab().number(fc.unusedBlocks).tab().number(fc.blocks);
+      w.tab().number(fc.adjUnusedLines).tab().number(fc.adjLines).tab().number(f->unusedFuncs);
+      w.tab().number(f->funcs).tab().number(saturate(f->sessions));
+      w.endLine();
+      const std::vector<LineState>& states = lineStates.of(*f);
+      for (const SumFunc* fn : f->funcOrder) writeFunction(w, *f, states, *fn);
+      w.text("efi\t").text(f->name).endLine();
+    }
+    w.text("edi\t").text(d->name).endLine();
+  }
+  return w.finish();
+}
+
+}  // namespace
+
+ErrorCode writeExport(FILE* stream, const SumRoot& root, std::time_t when) {
+  clearPendingSystemError();
+  try {
+    return writeReport(stream, root, when);
+  } catch (const std::bad_alloc&) {
+    return outOfMemory;
+  } catch (...) {
+    return fatalInternalError;
+  }
+}
+
+ErrorCode exportToFile(const SumRoot& root, const std::string& path) {
+  AtomicFileWriter out;
+  ErrorCode rc = out.open(path);
+  if (rc != allOK) return writeError;
+  rc = writeExport(out.stream(), root);
+  if (rc != allOK) {
+    out.abandon();
+    return rc;
+  }
+  return out.commit();
+}

@@ -1,0 +1,624 @@
+// Building and recomputing the summary tree: grouping records into directories and files,
+// counting lines, blocks and functions with and without adjustments, and the line states.
+#include "coverage/summary_build.h"
+
+#include <algorithm>
+#include <cctype>
+#include <cstdio>
+#include <cstdlib>
+#include <new>
+#include <string_view>
+#include <unordered_map>
+#include <utility>
+
+#include "coverage/string_block.h"
+#include "coverage/summary_sort.h"
+
+namespace {
+
+constexpr std::uint32_t kMaxSourceLines = 1u << 24;
+
+// Adjustment sets by path, first entry of a path winning as in the list's own lookup.
+class AdjustIndex {
+ public:
+  explicit AdjustIndex(const AdjustmentList& list) {
+    sets_.reserve(list.size());
+    for (const AdjustEntry& e : list.entries()) sets_.emplace(e.resolvedName(), e.set());
+  }
+  const CvgAdjustSet* find(const SumDir& dir, const SumFile& file) const {
+    if (sets_.empty()) return nullptr;
+    std::string path = std::string(dir.name) + file.name;
+    auto it = sets_.find(path);
+    return it == sets_.end() ? nullptr : it->second;
+  }
+
+ private:
+  std::unordered_map<std::string_view, const CvgAdjustSet*> sets_;
+};
+
+std::uint32_t adjustBits(const CvgAdjustSet* set, std::uint32_t line) {
+  return set ? set->lineKinds(line) : 0;
+}
+
+std::string_view dirPart(std::string_view path) {
+  std::size_t slash = path.rfind('/');
+  if (slash == std::string_view::npos) return kNoDirectoryName;
+  return path.substr(0, slash + 1);
+}
+
+std::string_view basePart(std::string_view path) {
+  std::size_t slash = path.rfind('/');
+  return slash == std::string_view::npos ? path : path.substr(slash + 1);
+}
+
+// The statistics of one file and its functions.
+class FileCounter {
+ public:
+  FileCounter(SumFile& file, std::uint32_t policy, const CvgAdjustSet* set)
+      : f_(file), policy_(policy), set_(set), map_(file.record->map),
+        counts_(file.record->counts) {}
+
+  ErrorCode run();
+
+ private:
+  std::size_t nextUsed(std::size_t i, std::size_t end) const {
+    while (i < end && mapTag(map_[i]) == TagEmpty) ++i;
+    return i;
+  }
+  std::uint32_t line(std::size_t i) const { return mapValue(map_[i]); }
+  std::uint16_t count(std::size_t i) const { return i < counts_.size() ? counts_[i] : 0; }
+  ErrorCode scanBlocks(SumFunc& fn, std::size_t start, std::size_t end, bool orderCheck);
+  void account(SumCounts& c, std::uint32_t lineNo, std::uint16_t hits) const;
+
+  SumFile& f_;
+  std::uint32_t policy_;
+  const CvgAdjustSet* set_;
+  std::vector<std::uint32_t>& map_;
+  std::vector<std::uint16_t>& counts_;
+};
+
+ErrorCode FileCounter::scanBlocks(SumFunc& fn, std::size_t start, std::size_t end,
+                                  bool orderCheck) {
+  if (mapTag(map_[start]) != TagBlock) return corruptKgvFile;
+  bool outOfOrder = false;
+  std::uint32_t previous = line(start);
+  for (std::size_t i = start; i < end; i = nextUsed(i + 1, end)) {
+    std::uint32_t tag = mapTag(map_[i]);
+    if (tag == TagBlock) {
+      ++fn.counts.blocks;
+      if (count(i) == 0) ++fn.counts.unusedBlocks;
+    } else if (tag != TagBlockLine) {
+      return corruptKgvFile;
+    }
+    if (line(i) < previous) outOfOrder = true;
+    previous = line(i);
+  }
+  if (orderCheck && outOfOrder) {
+    // A stable sort by line of the used entries among themselves: each entry out of order
+    // moves back behind the nearest earlier one whose line is not greater.
+    std::vector<std::size_t> places;
+    std::vector<std::pair<std::uint32_t, std::uint16_t>> entries;
+    for (std::size_t i = start; i < end; i = nextUsed(i + 1, end)) {
+      places.push_back(i);
+      entries.emplace_back(map_[i], count(i));
+    }
+    std::stable_sort(entries.begin(), entries.end(), [](const auto& a, const auto& b) {
+      return mapValue(a.first) < mapValue(b.first);
+    });
+    for (std::size_t k = 0; k < places.size(); ++k) {
+      map_[places[k]] = entries[k].first;
+      if (places[k] < counts_.size()) counts_[places[k]] = entries[k].second;
+    }
+  }
+  return allOK;
+}
+
+void FileCounter::account(SumCounts& c, std::uint32_t lineNo, std::uint16_t hits) const {
+  ++c.lines;
+  if (hits != 0) {
+    ++c.adjLines;
+    return;
+  }
+  ++c.unusedLines;
+  std::uint32_t bits = adjustBits(set_, lineNo);
+  if (bits == 0) {
+    ++c.adjLines;
+    ++c.adjUnusedLines;
+    return;
+  }
+  std::uint32_t d = dominantAdjustment(bits);
+  if (isDeadAdjustment(d)) {
+    ++c.deadLines;
+  } else if (isTestedAdjustment(d)) {
+    ++c.testedLines;
+    ++c.adjLines;
+  } else if (isInspectedAdjustment(d)) {
+    ++c.inspectedLines;
+    ++c.adjLines;
+  }
+}
+
+ErrorCode FileCounter::run() {
+  f_.counts = SumCounts{};
+  f_.unusedFuncs = 0;
+  f_.deadFuncs = 0;
+  f_.lineCount = 0;
+  const std::size_t n = map_.size();
+  if (n == 0) return allOK;
+  if (mapTag(map_[0]) != TagFile) return corruptKgvFile;
+  f_.sessions = count(0);
+
+  std::size_t funcNo = 0;
+  std::size_t i = nextUsed(1, n);
+  while (i < n) {
+    if (mapTag(map_[i]) != TagFunction || funcNo >= f_.functions.size()) return corruptKgvFile;
+    SumFunc& fn = f_.functions[funcNo++];
+    std::size_t end = i + 1;
+    while (end < n && mapTag(map_[end]) != TagFunction) ++end;
+
+    fn.counts = SumCounts{};
+    fn.allDead = false;
+    fn.firstLine = fn.lastLine = 0;
+    std::size_t next = nextUsed(i + 1, end);
+    if (next < end) {
+      if (mapTag(map_[next]) != TagFuncLine) {
+        ErrorCode rc = scanBlocks(fn, next, end, false);
+        if (rc != allOK) return rc;
+      } else {
+        fn.firstLine = fn.lastLine = line(next);
+        std::size_t s = nextUsed(next + 1, end);
+        if (s < end) {
+          ErrorCode rc = scanBlocks(fn, s, end, true);
+          if (rc != allOK) return rc;
+          std::uint32_t l = line(s);
+          std::uint16_t c = count(s);
+          std::uint16_t b = c;
+          fn.firstLine = l;
+          for (std::size_t k = nextUsed(s + 1, end); k < end; k = nextUsed(k + 1, end)) {
+            if (mapTag(map_[k]) == TagBlock) b = count(k);
+            if (line(k) != l) {
+              account(fn.counts, l, c);
+              c = b;
+              l = line(k);
+            } else {
+              c = combineHits(policy_, c, b);
+            }
+          }
+          account(fn.counts, l, c);
+          fn.lastLine = l;
+        }
+        // No source file has this many lines; such a number can only come from damaged
+        // data, and the line states for it would exhaust memory.
+        if (fn.lastLine > kMaxSourceLines) return corruptKgvFile;
+        f_.lineCount = std::max(f_.lineCount, fn.lastLine);
+      }
+    }
+    fn.firstMapIndex = static_cast<std::uint32_t>(i);
+    fn.lastMapIndex = static_cast<std::uint32_t>(end - 1);
+    fn.calls = count(i);
+    if (fn.calls == 0) ++f_.unusedFuncs;
+    if (fn.counts.lines != 0 && fn.counts.adjLines == 0) {
+      fn.allDead = true;
+      ++f_.deadFuncs;
+    }
+    f_.counts += fn.counts;
+    i = end;
+  }
+  return allOK;
+}
+
+void markLine(std::vector<LineState>& states, std::uint32_t lineNo, std::uint32_t flag) {
+  if (lineNo != 0 && lineNo <= states.size()) states[lineNo - 1].flags |= flag;
+}
+
+// The state of one class pass over a file's lines.
+struct ClassPass {
+  std::size_t previous = 0;  // 1-based line of the previous relevant line; 0 = none
+  std::uint32_t previousClass = 0;
+  bool inFunction = false;
+
+  // The class of line l; lines between two relevant lines of the same class in a function
+  // are filled through `store`.
+  template <typename Store>
+  std::uint32_t step(std::vector<LineState>& states, std::size_t l, std::uint32_t flags,
+                     bool relevant, bool good, Store store) {
+    std::uint32_t cls = ClassNothing;
+    if (flags & LineFuncStart) inFunction = true;
+    if (relevant) {
+      cls = good ? ClassUsed : ClassUnused;
+      if (cls == previousClass && inFunction && previous != 0) {
+        for (std::size_t k = previous + 1; k < l; ++k)
+          store(states[k - 1], good ? ClassBetweenUsed : ClassBetweenUnused);
+      }
+      previous = l;
+      previousClass = cls;
+    }
+    if (flags & LineFuncEnd) {
+      inFunction = false;
+      previous = 0;
+    }
+    return cls;
+  }
+};
+
+// Both passes in one walk: actual (relevant = has code, good = used) and adjusted
+// (relevant = counts for adjusted coverage, good = adjusted used).
+void classifyLines(std::vector<LineState>& states) {
+  ClassPass actual, adjusted;
+  for (std::size_t l = 1; l <= states.size(); ++l) {
+    LineState& s = states[l - 1];
+    std::uint32_t flags = s.flags;
+    bool code = (flags & LineHasCode) != 0;
+    bool used = code && s.count != 0;
+    bool adjRelevant = code, adjGood = used;
+    // Lines without adjustments (nearly all) are decided here; the others by the predicates.
+    if (flags & kAdjustMask) {
+      adjRelevant = lineCountsForAdjusted(flags, s.count);
+      adjGood = lineAdjustedUsed(flags, s.count);
+    }
+    s.actualClass = actual.step(states, l, flags, code, used,
+                                [](LineState& t, std::uint32_t c) { t.actualClass = c; });
+    s.adjustedClass = adjusted.step(states, l, flags, adjRelevant, adjGood,
+                                    [](LineState& t, std::uint32_t c) { t.adjustedClass = c; });
+  }
+}
+
+void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
+                     bool checkCorrupted, std::vector<LineState>& states) {
+  states.assign(f.lineCount, LineState{});
+  if (f.lineCount == 0) return;
+  const std::vector<std::uint32_t>& map = f.record->map;
+  const std::vector<std::uint16_t>& counts = f.record->counts;
+  std::uint32_t last = 0;
+  std::uint16_t blockCount = 0;
+  bool reported = false;
+  for (std::size_t i = 0; i < map.size(); ++i) {
+    std::uint32_t tag = mapTag(map[i]);
+    std::uint32_t v = mapValue(map[i]);
+    if (tag == TagFuncLine) {
+      markLine(states, last, LineFuncEnd);
+      markLine(states, v, LineFuncStart);
+      last = v;
+    } else if (tag == TagBlock || tag == TagBlockLine) {
+      if (tag == TagBlock) blockCount = i < counts.size() ? counts[i] : 0;
+      if (v > f.lineCount) {
+        // Lines past the end of the file's lines are never stored; with the variable set
+        // the first one of the file is reported.
+        if (checkCorrupted && !reported) {
+          reported = true;
+          fflush(stderr);
+          printf("The line number information of file %s is corrupted.\n"
+                 "Kestrel will not process this information\n",
+                 f.record->fileName());
+          fflush(stdout);
+        }
+        continue;
+      }
+      if (v != 0) {
+        LineState& s = states[v - 1];
+        if (s.flags & LineHasCode) {
+          s.count = combineHits(policy, s.count, blockCount);
+        } else {
+          s.count = blockCount;
+          s.flags |= LineHasCode | adjustBits(set, v);
+        }
+      }
+      last = v;
+    }
+  }
+  markLine(states, last, LineFuncEnd);
+  if (set) {
+    for (std::uint32_t l = 1; l <= f.lineCount; ++l) states[l - 1].flags |= set->lineKinds(l);
+  }
+  classifyLines(states);
+}
+
+void addTimes(std::uint32_t& first, std::uint32_t& last, std::uint32_t f, std::uint32_t l) {
+  first = std::min(first, f);
+  last = std::max(last, l);
+}
+
+ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustIndex& index,
+                            bool withLineStates) {
+  root.counts = SumCounts{};
+  root.funcs = root.unusedFuncs = root.deadFuncs = root.files = 0;
+  root.firstTime = 0x7FFFFFFF;
+  root.lastTime = 0;
+  bool checkCorrupted = std::getenv("PROCESS_CORRUPTED_LINES") != nullptr;
+  for (SumDir& d : root.dirRecords) {
+    d.counts = SumCounts{};
+    d.funcs = d.unusedFuncs = d.deadFuncs = 0;
+    d.firstTime = 0x7FFFFFFF;
+    d.lastTime = 0;
+    for (SumFile& f : d.fileRecords) {
+      const CvgAdjustSet* set = index.find(d, f);
+      ErrorCode rc = FileCounter(f, policy, set).run();
+      if (rc != allOK) return rc;
+      d.counts += f.counts;
+      d.funcs += f.funcs;
+      d.unusedFuncs += f.unusedFuncs;
+      d.deadFuncs += f.deadFuncs;
+      addTimes(d.firstTime, d.lastTime, f.firstTime, f.lastTime);
+    }
+    root.counts += d.counts;
+    root.funcs += d.funcs;
+    root.unusedFuncs += d.unusedFuncs;
+    root.deadFuncs += d.deadFuncs;
+    root.files += d.files;
+    addTimes(root.firstTime, root.lastTime, d.firstTime, d.lastTime);
+  }
+  for (SumDir& d : root.dirRecords) {
+    for (SumFile& f : d.fileRecords) {
+      if (withLineStates) {
+        buildLineStates(f, policy, index.find(d, f), checkCorrupted, f.lineStates);
+      } else {
+        f.lineStates.clear();
+        f.lineStates.shrink_to_fit();
+      }
+    }
+  }
+  return allOK;
+}
+
+bool namesEqualIgnoringDashes(const char* a, const char* b) {
+  for (;;) {
+    while (*a == '-' || *a == '_') ++a;
+    while (*b == '-' || *b == '_') ++b;
+    if (!*a || !*b) return *a == *b;
+    if (std::tolower(static_cast<unsigned char>(*a)) != std::tolower(static_cast<unsigned char>(*b)))
+      return false;
+    ++a;
+    ++b;
+  }
+}
+
+// The old records of one level by name, for matching in order with wrap-around.
+template <typename Record>
+class NameMatcher {
+ public:
+  explicit NameMatcher(const std::vector<Record*>& order) : order_(order) {
+    for (std::size_t i = 0; i < order.size(); ++i)
+      places_[std::string_view(order[i]->name)].push_back(i);
+  }
+  // The first record of that name at or after `start`, else the first one before it.
+  const Record* find(const char* name, std::size_t& start) const {
+    auto it = places_.find(std::string_view(name));
+    if (it == places_.end()) return nullptr;
+    const std::vector<std::size_t>& p = it->second;
+    auto at = std::lower_bound(p.begin(), p.end(), start);
+    std::size_t pos = at != p.end() ? *at : p.front();
+    start = pos + 1;
+    return order_[pos];
+  }
+
+ private:
+  const std::vector<Record*>& order_;
+  std::unordered_map<std::string_view, std::vector<std::size_t>> places_;
+};
+
+}  // namespace
+
+std::uint16_t combineHits(std::uint32_t policy, std::uint16_t first, std::uint16_t next) {
+  switch (policy) {
+    case hitsMin: return std::min(first, next);
+    case hitsFirst: return first;
+    case hitsLast: return next;
+    default: return std::max(first, next);
+  }
+}
+
+std::uint32_t hitsPolicyFromText(const char* value) {
+  if (!value || !*value) return hitsMax;
+  static const char* const names[] = {"max", "min", "first", "last"};
+  for (std::uint32_t i = 0; i < 4; ++i) {
+    if (namesEqualIgnoringDashes(value, names[i])) return i + 1;
+  }
+  return hitsMax;
+}
+
+std::uint32_t getHitsPolicy() {
+  static const std::uint32_t policy = hitsPolicyFromText(std::getenv("KESTREL_HITS_POLICY"));
+  return policy;
+}
+
+namespace {
+
+ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
+                    const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out,
+                    bool withLineStates) {
+  auto root = std::make_unique<SumRoot>();
+  root->hitsPolicy = hitsPolicy;
+
+  // Directories: the distinct directory parts in sorted order.
+  StringBlock dirBlock;
+  for (const auto& rec : data.records) {
+    ErrorCode rc = dirBlock.addBorrowed(dirPart(rec->fileNameView()));
+    if (rc != allOK) return rc;
+  }
+  std::uint32_t dirCount = 0, words = 0;
+  ErrorCode rc = dirBlock.freeze(root->dirNames, dirCount, words);
+  if (rc != allOK) return rc;
+  root->dirs = dirCount;
+  root->dirRecords.resize(dirCount);
+  const std::vector<std::uint32_t>& dirOffsets = dirBlock.sortedOffsets();
+  for (std::uint32_t i = 0; i < dirCount; ++i) {
+    root->dirRecords[i].name = root->dirNames.data() + dirOffsets[i];
+    root->dirOrder.push_back(&root->dirRecords[i]);
+  }
+
+  // Files: each record's base name in its directory's own table.
+  std::vector<StringBlock> fileBlocks(dirCount);
+  std::vector<std::uint32_t> recordDir(data.records.size());
+  for (std::size_t r = 0; r < data.records.size(); ++r) {
+    std::string_view path = data.records[r]->fileNameView();
+    std::uint32_t offset = 0, position = 0;
+    rc = dirBlock.find(dirPart(path), offset, position);
+    if (rc != allOK) return rc;
+    recordDir[r] = position;
+    SumDir& d = root->dirRecords[position];
+    if (d.nativeIndex == 0) d.nativeIndex = static_cast<std::uint32_t>(r + 1);
+    rc = fileBlocks[position].addBorrowed(basePart(path));
+    if (rc != allOK) return rc;
+  }
+  for (std::uint32_t i = 0; i < dirCount; ++i) {
+    SumDir& d = root->dirRecords[i];
+    std::uint32_t fileCount = 0;
+    rc = fileBlocks[i].freeze(d.fileNames, fileCount, words);
+    if (rc != allOK) return rc;
+    d.files = fileCount;
+    d.fileRecords.resize(fileCount);
+    const std::vector<std::uint32_t>& offsets = fileBlocks[i].sortedOffsets();
+    for (std::uint32_t k = 0; k < fileCount; ++k) {
+      d.fileRecords[k].name = d.fileNames.data() + offsets[k];
+      d.fileRecords[k].dir = &d;
+      d.fileOrder.push_back(&d.fileRecords[k]);
+    }
+  }
+  for (std::size_t r = 0; r < data.records.size(); ++r) {
+    ObjRecord& rec = *data.records[r];
+    SumDir& d = root->dirRecords[recordDir[r]];
+    std::uint32_t offset = 0, position = 0;
+    rc = fileBlocks[recordDir[r]].find(basePart(rec.fileNameView()), offset, position);
+    if (rc != allOK) return rc;
+    SumFile& f = d.fileRecords[position];
+    f.firstTime = rec.objHeader.firstTime;
+    f.lastTime = rec.objHeader.lastTime;
+    f.nativeIndex = static_cast<std::uint32_t>(r + 1);
+    f.record = &rec;
+  }
+
+  // Functions: one per TagFunction entry, in map order.
+  for (SumDir& d : root->dirRecords) {
+    for (SumFile& f : d.fileRecords) {
+      const std::vector<std::uint32_t>& map = f.record->map;
+      std::uint32_t n = 0;
+      for (std::uint32_t e : map) n += mapTag(e) == TagFunction;
+      f.funcs = n;
+      f.functions.resize(n);
+      std::uint32_t k = 0;
+      for (std::size_t i = 0; i < map.size(); ++i) {
+        if (mapTag(map[i]) != TagFunction) continue;
+        SumFunc& fn = f.functions[k++];
+        fn.nativeIndex = static_cast<std::uint32_t>(i);
+        fn.name = f.record->nameAt(mapValue(map[i]));
+      }
+      f.funcOrder.reserve(n);
+      for (SumFunc& fn : f.functions) f.funcOrder.push_back(&fn);
+    }
+  }
+
+  rc = computeStatistics(*root, hitsPolicy, AdjustIndex(adjustments), withLineStates);
+  if (rc != allOK) return rc;
+  sortSummary(*root, sortOrder);
+  out = std::move(root);
+  return allOK;
+}
+
+}  // namespace
+
+ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
+                       const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out,
+                       bool withLineStates) {
+  out.reset();
+  try {
+    return buildTree(data, sortOrder, hitsPolicy, adjustments, out, withLineStates);
+  } catch (const std::bad_alloc&) {
+    out.reset();
+    return outOfMemory;
+  } catch (...) {
+    out.reset();
+    return fatalInternalError;
+  }
+}
+
+ErrorCode recomputeSummary(SumRoot& root, std::uint32_t hitsPolicy,
+                           const AdjustmentList& adjustments) {
+  root.hitsPolicy = hitsPolicy;
+  try {
+    return computeStatistics(root, hitsPolicy, AdjustIndex(adjustments), true);
+  } catch (const std::bad_alloc&) {
+    return outOfMemory;
+  } catch (...) {
+    return fatalInternalError;
+  }
+}
+
+void setViewState(SumRoot& root, std::uint32_t value) {
+  root.viewState = value;
+  for (SumDir& d : root.dirRecords) {
+    d.viewState = value;
+    for (SumFile& f : d.fileRecords) {
+      f.viewState = value;
+      for (SumFunc& fn : f.functions) fn.viewState = value;
+    }
+  }
+}
+
+void carryViewState(SumRoot* newRoot, const SumRoot* oldRoot, std::uint32_t defaultValue) {
+  if (!newRoot) return;
+  if (!oldRoot) {
+    setViewState(*newRoot, defaultValue);
+    return;
+  }
+  newRoot->viewState = oldRoot->viewState;
+  NameMatcher<SumDir> dirs(oldRoot->dirOrder);
+  std::size_t dirStart = 0;
+  for (SumDir* d : newRoot->dirOrder) {
+    const SumDir* od = dirs.find(d->name, dirStart);
+    if (!od) {
+      d->viewState = defaultValue;
+      continue;
+    }
+    d->viewState = od->viewState;
+    NameMatcher<SumFile> files(od->fileOrder);
+    std::size_t fileStart = 0;
+    for (SumFile* f : d->fileOrder) {
+      const SumFile* of = files.find(f->name, fileStart);
+      if (!of) {
+        f->viewState = defaultValue;
+        continue;
+      }
+      f->viewState = of->viewState;
+      NameMatcher<SumFunc> funcs(of->funcOrder);
+      std::size_t funcStart = 0;
+      for (SumFunc* fn : f->funcOrder) {
+        const SumFunc* ofn = funcs.find(fn->name, funcStart);
+        fn->viewState = ofn ? ofn->viewState : defaultValue;
+      }
+    }
+  }
+}
+
+SumFile* findSumFile(SumRoot& root, const std::string& path) {
+  std::string_view p(path);
+  for (SumDir& d : root.dirRecords) {
+    std::string_view dn(d.name);
+    if (p.size() < dn.size() || p.compare(0, dn.size(), dn) != 0) continue;
+    std::string_view base = p.substr(dn.size());
+    // Files are in sorted name order within their directory.
+    auto it = std::lower_bound(d.fileRecords.begin(), d.fileRecords.end(), base,
+                               [](const SumFile& f, std::string_view b) {
+                                 return std::string_view(f.name) < b;
+                               });
+    if (it != d.fileRecords.end() && std::string_view(it->name) == base) return &*it;
+  }
+  return nullptr;
+}
+
+struct LazyLineStates::Index {
+  explicit Index(const AdjustmentList& list) : sets(list) {}
+  AdjustIndex sets;
+};
+
+LazyLineStates::LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy)
+    : index_(std::make_unique<Index>(adjustments)), policy_(hitsPolicy),
+      checkCorrupted_(std::getenv("PROCESS_CORRUPTED_LINES") != nullptr) {}
+
+LazyLineStates::~LazyLineStates() = default;
+
+const std::vector<LineState>& LazyLineStates::of(const SumFile& file) {
+  if (file.lineCount == 0 || !file.lineStates.empty() || !file.dir || !file.record)
+    return file.lineStates;
+  buildLineStates(file, policy_, index_->sets.find(*file.dir, file), checkCorrupted_, scratch_);
+  return scratch_;
+}

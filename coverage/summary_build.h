@@ -1,0 +1,65 @@
+// Building the summary tree from loaded data: directories, files and functions, their
+// actual and adjusted counts and per-line states; rebuilding counts after adjustments
+// change; carrying row state from an old tree to a new one; finding a file by path.
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "adjust/adjustment_list.h"
+#include "adjust/errors.h"
+#include "coverage/kgv_data.h"
+#include "coverage/summary_types.h"
+
+// How the hits of several blocks on one line combine into the line's count.
+enum HitsPolicy : std::uint32_t { hitsMax = 1, hitsMin = 2, hitsFirst = 3, hitsLast = 4 };
+
+// The combination of the count already there (first) and a new one under the policy.
+std::uint16_t combineHits(std::uint32_t policy, std::uint16_t first, std::uint16_t next);
+
+// KESTREL_HITS_POLICY read once ("max", "min", "first", "last" under the option-name rule);
+// 1 (max) when unset, empty or unknown. Later calls give the same value.
+std::uint32_t getHitsPolicy();
+// The same rule over a given value (nullptr: unset); for tests and the first call.
+std::uint32_t hitsPolicyFromText(const char* value);
+
+// Builds the whole tree and sorts it. The data's maps may be reordered in place where a
+// function's blocks are out of line order. On failure nothing is handed back. Without line
+// states (a report that reads each file once) they are made per file by LazyLineStates.
+ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
+                       const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out,
+                       bool withLineStates = true);
+
+// Counts and line states again over an existing tree (after the adjustments changed); the
+// records, names and order stay.
+ErrorCode recomputeSummary(SumRoot& root, std::uint32_t hitsPolicy,
+                           const AdjustmentList& adjustments);
+
+void setViewState(SumRoot& root, std::uint32_t value);
+// Each row of the new tree takes the state of the old row of the same name (by level);
+// rows without a match get the default. An absent old tree gives every row the default.
+void carryViewState(SumRoot* newRoot, const SumRoot* oldRoot, std::uint32_t defaultValue);
+
+// The first file whose directory name followed by its base name is the path; nullptr if none.
+SumFile* findSumFile(SumRoot& root, const std::string& path);
+
+// The line states of a file: those of the tree when it has them, else made on request
+// (into a buffer reused for the next file) from the adjustments and the hits policy.
+class LazyLineStates {
+ public:
+  LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy);
+  ~LazyLineStates();
+  LazyLineStates(const LazyLineStates&) = delete;
+  LazyLineStates& operator=(const LazyLineStates&) = delete;
+  // Valid until the next call.
+  const std::vector<LineState>& of(const SumFile& file);
+
+ private:
+  struct Index;
+  std::unique_ptr<Index> index_;
+  std::uint32_t policy_;
+  bool checkCorrupted_;
+  std::vector<LineState> scratch_;
+};

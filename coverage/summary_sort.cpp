@@ -1,0 +1,148 @@
+// Sorting the summary tree: the count, ratio, name and native-index comparisons with the
+// common tie-break, applied to every level.
+#include "coverage/summary_sort.h"
+
+#include <algorithm>
+#include <cstring>
+#include <functional>
+
+#include "summary/sort_orders.h"
+
+namespace {
+
+// Name by bytes, then native index, then place in memory.
+int tieBreak(const SortKey& a, const SortKey& b) {
+  int c = std::strcmp(a.name, b.name);
+  if (c != 0) return c;
+  if (a.nativeIndex != b.nativeIndex) return a.nativeIndex < b.nativeIndex ? -1 : 1;
+  if (a.address == b.address) return 0;
+  return std::less<const void*>()(a.address, b.address) ? -1 : 1;
+}
+
+// Larger values first.
+int descending(std::uint32_t x, std::uint32_t y) { return x > y ? -1 : (x < y ? 1 : 0); }
+
+// Larger ratio first; a zero denominator goes first (zeroFirst) or last.
+int ratioDescending(std::uint32_t an, std::uint32_t ad, std::uint32_t bn, std::uint32_t bd,
+                    bool zeroFirst) {
+  if (ad == 0 || bd == 0) {
+    if (ad == 0 && bd == 0) return 0;
+    bool aZero = ad == 0;
+    return (aZero == zeroFirst) ? -1 : 1;
+  }
+  double left = double(an) * double(bd);
+  double right = double(bn) * double(ad);
+  if (left > right) return -1;
+  if (left < right) return 1;
+  return 0;
+}
+
+template <int (*Primary)(const SumCounts&, const SumCounts&)>
+int withTieBreak(const SortKey& a, const SortKey& b) {
+  if (a.address == b.address) return 0;
+  int c = Primary(*a.counts, *b.counts);
+  return c != 0 ? c : tieBreak(a, b);
+}
+
+int byNothing(const SumCounts&, const SumCounts&) { return 0; }
+int byLines(const SumCounts& a, const SumCounts& b) { return descending(a.lines, b.lines); }
+int byLUsed(const SumCounts& a, const SumCounts& b) {
+  return descending(a.usedLines(), b.usedLines());
+}
+int byLUsedPct(const SumCounts& a, const SumCounts& b) {
+  return ratioDescending(a.usedLines(), a.lines, b.usedLines(), b.lines, true);
+}
+int byLUnused(const SumCounts& a, const SumCounts& b) {
+  return descending(a.unusedLines, b.unusedLines);
+}
+int byLUnusedPct(const SumCounts& a, const SumCounts& b) {
+  return ratioDescending(a.unusedLines, a.lines, b.unusedLines, b.lines, false);
+}
+int byAdjLines(const SumCounts& a, const SumCounts& b) {
+  return descending(a.adjLines, b.adjLines);
+}
+int byAlUsed(const SumCounts& a, const SumCounts& b) {
+  return descending(a.adjUsedLines(), b.adjUsedLines());
+}
+int byAlUsedPct(const SumCounts& a, const SumCounts& b) {
+  return ratioDescending(a.adjUsedLines(), a.adjLines, b.adjUsedLines(), b.adjLines, true);
+}
+int byAlUnused(const SumCounts& a, const SumCounts& b) {
+  return descending(a.adjUnusedLines, b.adjUnusedLines);
+}
+int byAlUnusedPct(const SumCounts& a, const SumCounts& b) {
+  return ratioDescending(a.adjUnusedLines, a.adjLines, b.adjUnusedLines, b.adjLines, false);
+}
+int byBlocks(const SumCounts& a, const SumCounts& b) { return descending(a.blocks, b.blocks); }
+int byBUsed(const SumCounts& a, const SumCounts& b) {
+  return descending(a.usedBlocks(), b.usedBlocks());
+}
+int byBUsedPct(const SumCounts& a, const SumCounts& b) {
+  return ratioDescending(a.usedBlocks(), a.blocks, b.usedBlocks(), b.blocks, true);
+}
+int byBUnused(const SumCounts& a, const SumCounts& b) {
+  return descending(a.unusedBlocks, b.unusedBlocks);
+}
+int byBUnusedPct(const SumCounts& a, const SumCounts& b) {
+  return ratioDescending(a.unusedBlocks, a.blocks, b.unusedBlocks, b.blocks, false);
+}
+
+int byNative(const SortKey& a, const SortKey& b) {
+  if (a.address == b.address) return 0;
+  if (a.nativeIndex != b.nativeIndex) return a.nativeIndex < b.nativeIndex ? -1 : 1;
+  return tieBreak(a, b);
+}
+
+template <typename Record>
+SortKey keyOf(const Record* r) {
+  return SortKey{r->name, r->nativeIndex, &r->counts, r};
+}
+
+template <typename Record>
+void sortLevel(std::vector<Record*>& order, SortComparison cmp) {
+  if (order.size() < 2) return;
+  std::sort(order.begin(), order.end(), [cmp](const Record* a, const Record* b) {
+    return cmp(keyOf(a), keyOf(b)) < 0;
+  });
+}
+
+}  // namespace
+
+SortComparison sortComparator(std::uint32_t id) {
+  switch (id) {
+    case 1: return withTieBreak<byNothing>;
+    case 2: return byNative;
+    case 3: return withTieBreak<byLines>;
+    case 4: return withTieBreak<byLUsed>;
+    case 5: return withTieBreak<byLUsedPct>;
+    case 6: return withTieBreak<byLUnused>;
+    case 7: return withTieBreak<byLUnusedPct>;
+    case 8: return withTieBreak<byAdjLines>;
+    case 9: return withTieBreak<byAlUsed>;
+    case 10: return withTieBreak<byAlUsedPct>;
+    case 11: return withTieBreak<byAlUnused>;
+    case 12: return withTieBreak<byAlUnusedPct>;
+    case 13: return withTieBreak<byBlocks>;
+    case 14: return withTieBreak<byBUsed>;
+    case 15: return withTieBreak<byBUsedPct>;
+    case 16: return withTieBreak<byBUnused>;
+    case 17: return withTieBreak<byBUnusedPct>;
+    default: return nullptr;
+  }
+}
+
+ErrorCode parseSortOrder(const char* name, std::uint32_t& id) {
+  return sort_order_by_name(name, id);
+}
+
+ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder) {
+  SortComparison cmp = sortComparator(sortOrder);
+  if (!cmp) return allOK;
+  sortLevel(root.dirOrder, cmp);
+  for (SumDir* d : root.dirOrder) {
+    sortLevel(d->fileOrder, cmp);
+    for (SumFile* f : d->fileOrder) sortLevel(f->funcOrder, cmp);
+  }
+  root.sortOrder = sortOrder;
+  return allOK;
+}

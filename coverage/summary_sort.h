@@ -1,0 +1,29 @@
+// The seventeen orders of the summary tree: their comparisons, name lookup and the sort of
+// every level of a tree.
+#pragma once
+
+#include <cstdint>
+
+#include "adjust/errors.h"
+#include "coverage/summary_types.h"
+
+// What a comparison sees of a directory, file or function record.
+struct SortKey {
+  const char* name;
+  std::uint32_t nativeIndex;
+  const SumCounts* counts;
+  const void* address;  // last tie-break: position in memory
+};
+
+// Negative when a comes first, positive when b does, 0 for the same record.
+using SortComparison = int (*)(const SortKey& a, const SortKey& b);
+
+// The comparison of an order (1..17); nullptr for 18 or any id outside the table.
+SortComparison sortComparator(std::uint32_t id);
+
+// Exact, case-sensitive lookup of the name; absent, empty or unknown: invalidSortingOrder.
+ErrorCode parseSortOrder(const char* name, std::uint32_t& id);
+
+// Sorts dirOrder, every fileOrder and every funcOrder by the order and stores it in the
+// root. Ids outside 1..17 leave the tree as it is.
+ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder);

@@ -1,0 +1,18 @@
+// The console export: notes on standard error, the report on standard output.
+#include "startup/export_mode.h"
+
+#include <cstdio>
+
+#include "adjust/export_report.h"
+#include "startup/merge_mode.h"
+
+ErrorCode runExportMode(StartupSummary& prepared) {
+  if (prepared.loadStatus == mergeIgnored) reportOutOfDate(prepared.ignored);
+  reportAdjustmentProblems(prepared.adjustmentProblems);
+  ErrorCode rc = writeExport(stdout, *prepared.summary);
+  if (rc != allOK) {
+    reportError(rc, "Couldn't export\n%s\n", errorMessage(rc).c_str());
+    return rc;
+  }
+  return allOK;
+}

@@ -1,0 +1,396 @@
+// The summary tree as users see it: counts with and without adjustments, line states,
+// the sort orders, view state across a rebuild, finding files.
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+
+#include "coverage/summary_build.h"
+#include "coverage/summary_sort.h"
+#include "summary/sort_orders.h"
+#include "tests/coverage/kgv_test_util.h"
+
+namespace {
+
+struct Built {
+  kgtest::TempDir dir;
+  std::unique_ptr<KgvData> data;
+  std::unique_ptr<SumRoot> root;
+  ErrorCode rc = allOK;
+};
+
+std::unique_ptr<Built> build(const std::string& text, const AdjustmentList& adj = {},
+                             std::uint32_t order = 1, std::uint32_t policy = hitsMax) {
+  auto b = std::make_unique<Built>();
+  b->data = kgtest::readOk(kgtest::makeKgv(b->dir, "t.kgv", text));
+  if (!b->data) return b;
+  b->rc = buildSummary(*b->data, order, policy, adj, b->root);
+  return b;
+}
+
+const SumFile& onlyFile(const SumRoot& r) { return r.dirRecords.at(0).fileRecords.at(0); }
+
+AdjustmentList adjustments(const std::string& path, CvgAdjust kind, std::uint32_t first,
+                           std::uint32_t last) {
+  AdjustmentList list;
+  auto set = std::make_unique<CvgAdjustSet>();
+  set->addRange(kind, first, last);
+  list.append(AdjustEntry(makeKgvFileRef(path, path), std::move(set)));
+  return list;
+}
+
+std::vector<std::string> dirNames(const SumRoot& r) {
+  std::vector<std::string> v;
+  for (const SumDir* d : r.dirOrder) v.push_back(d->name);
+  return v;
+}
+
+std::vector<std::string> fileNames(const SumDir& d) {
+  std::vector<std::string> v;
+  for (const SumFile* f : d.fileOrder) v.push_back(f->name);
+  return v;
+}
+
+const char kTwoBlocksOneLine[] =
+    "record src/a.c\n"
+    "function f line=1 calls=1\n"
+    "block 2 hits=3\n"
+    "block 2 hits=0\n";
+
+}  // namespace
+
+TEST(SummaryHits, TwoBlocksOnOneLineCombineByThePolicy) {
+  auto count = [](std::uint32_t policy) {
+    auto b = build(kTwoBlocksOneLine, {}, 1, policy);
+    EXPECT_EQ(b->rc, allOK);
+    const SumFile& f = onlyFile(*b->root);
+    EXPECT_EQ(f.counts.lines, 1u);
+    EXPECT_EQ(f.counts.blocks, 2u);
+    EXPECT_EQ(f.counts.unusedBlocks, 1u);
+    return std::make_pair(f.counts.unusedLines, f.lineStates.at(1).count);
+  };
+  EXPECT_EQ(count(hitsMax), std::make_pair(0u, std::uint16_t(3)));
+  EXPECT_EQ(count(hitsFirst), std::make_pair(0u, std::uint16_t(3)));
+  EXPECT_EQ(count(hitsMin), std::make_pair(1u, std::uint16_t(0)));
+  EXPECT_EQ(count(hitsLast), std::make_pair(1u, std::uint16_t(0)));
+}
+
+TEST(SummaryHits, ThePolicyNameFollowsTheOptionNameRule) {
+  EXPECT_EQ(hitsPolicyFromText(nullptr), 1u);
+  EXPECT_EQ(hitsPolicyFromText(""), 1u);
+  EXPECT_EQ(hitsPolicyFromText("MIN"), 2u);
+  EXPECT_EQ(hitsPolicyFromText("-fi_rst"), 3u);
+  EXPECT_EQ(hitsPolicyFromText("Last"), 4u);
+  EXPECT_EQ(hitsPolicyFromText("largest"), 1u);
+}
+
+TEST(SummaryCounts, AFunctionWithoutALineEntryHasBlocksButNoLines) {
+  auto b = build(
+      "record a.c\n"
+      "function g calls=0\n"
+      "block 40 hits=0\n"
+      "blockline 41\n"
+      "function f line=3 calls=2\n"
+      "block 4 hits=1\n");
+  ASSERT_EQ(b->rc, allOK);
+  const SumFile& f = onlyFile(*b->root);
+  EXPECT_STREQ(b->root->dirRecords[0].name, "**no_directory_provided**/");
+  EXPECT_STREQ(f.name, "a.c");
+  ASSERT_EQ(f.functions.size(), 2u);
+  const SumFunc& g = f.functions[0];
+  EXPECT_STREQ(g.name, "g");
+  EXPECT_EQ(g.counts.blocks, 1u);
+  EXPECT_EQ(g.counts.lines, 0u);
+  EXPECT_EQ(g.firstLine, 0u);
+  EXPECT_EQ(f.unusedFuncs, 1u);
+  // Its lines 40 and 41 lie beyond the file's lines and are never stored.
+  EXPECT_EQ(f.lineCount, 4u);
+  EXPECT_EQ(f.lineStates.size(), 4u);
+  EXPECT_EQ(f.functions[1].firstMapIndex, 4u);
+  EXPECT_EQ(f.functions[1].lastMapIndex, 6u);
+}
+
+TEST(SummaryCounts, BlockLinesBeyondTheFileAreReportedOnlyWhenAsked) {
+  const char text[] =
+      "record d/late.c\n"
+      "function g\n"
+      "block 90\n"
+      "block 91\n"
+      "function f line=2 calls=1\n"
+      "block 2 hits=1\n";
+  kgtest::TempDir dir;
+  std::string path = kgtest::makeKgv(dir, "c.kgv", text);
+  auto r = kgtest::runProcess({kgtest::binPath("kestrel"), "-export", path},
+                              {"HOME=" + dir.path(), "PROCESS_CORRUPTED_LINES=1"});
+  EXPECT_EQ(r.status, 0) << r.err;
+  EXPECT_EQ(r.out.rfind("The line number information of file d/late.c is corrupted.\n"
+                        "Kestrel will not process this information\n#####",
+                        0),
+            0u)
+      << r.out.substr(0, 200);
+  r = kgtest::runProcess({kgtest::binPath("kestrel"), "-export", path}, {"HOME=" + dir.path()});
+  EXPECT_EQ(r.status, 0);
+  EXPECT_EQ(r.out.find("corrupted"), std::string::npos);
+  EXPECT_NE(r.out.find("li\t2\t1\n"), std::string::npos);
+}
+
+TEST(SummaryAdjusted, DeadTestedAndInspectedLinesCountWhereTheyShould) {
+  const char text[] =
+      "record src/x.c\n"
+      "function f line=1 calls=1\n"
+      "block 2 hits=0\n"
+      "block 3 hits=4\n"
+      "block 4 hits=0\n"
+      "block 5 hits=0\n"
+      "block 6 hits=0\n";
+  AdjustmentList adj;
+  auto set = std::make_unique<CvgAdjustSet>();
+  set->addRange(adjRangeDead, 2, 3);       // 2 unused dead, 3 used dead
+  set->addRange(adjLineTested, 4, 4);      // 4 tested
+  set->addRange(adjLineInspected, 5, 5);   // 5 inspected
+  adj.append(AdjustEntry(makeKgvFileRef("src/x.c", "src/x.c"), std::move(set)));
+  auto b = build(text, adj);
+  ASSERT_EQ(b->rc, allOK);
+  const SumFunc& fn = onlyFile(*b->root).functions[0];
+  EXPECT_EQ(fn.counts.lines, 5u);
+  EXPECT_EQ(fn.counts.unusedLines, 4u);
+  EXPECT_EQ(fn.counts.deadLines, 1u);
+  EXPECT_EQ(fn.counts.testedLines, 1u);
+  EXPECT_EQ(fn.counts.inspectedLines, 1u);
+  EXPECT_EQ(fn.counts.adjLines, 4u);        // 3 (used), 4, 5, 6
+  EXPECT_EQ(fn.counts.adjUnusedLines, 1u);  // 6 only
+  EXPECT_FALSE(fn.allDead);
+  const auto& ls = onlyFile(*b->root).lineStates;
+  EXPECT_EQ(ls[1].flags & kAdjustMask, std::uint32_t(adjRangeDead));
+  EXPECT_EQ(ls[1].actualClass, std::uint32_t(ClassUnused));
+  EXPECT_EQ(ls[1].adjustedClass, std::uint32_t(ClassNothing));  // dead: not counted
+  EXPECT_EQ(ls[3].adjustedClass, std::uint32_t(ClassUsed));     // tested
+  EXPECT_EQ(ls[5].adjustedClass, std::uint32_t(ClassUnused));
+  EXPECT_TRUE(ls[0].flags & LineFuncStart);
+  EXPECT_TRUE(ls[5].flags & LineFuncEnd);
+
+  // Without the set the same data count every unused line.
+  ASSERT_EQ(recomputeSummary(*b->root, hitsMax, AdjustmentList{}), allOK);
+  EXPECT_EQ(fn.counts.adjLines, 5u);
+  EXPECT_EQ(fn.counts.adjUnusedLines, 4u);
+  EXPECT_EQ(onlyFile(*b->root).lineStates[1].flags & kAdjustMask, 0u);
+}
+
+TEST(SummaryAdjusted, AFunctionOfOnlyUnusedDeadLinesIsAllDead) {
+  auto b = build(
+      "record src/d.c\n"
+      "function gone line=10 calls=0\n"
+      "block 11 hits=0\n"
+      "block 12 hits=0\n"
+      "function kept line=20 calls=1\n"
+      "block 21 hits=1\n",
+      adjustments("src/d.c", adjRangeDead, 10, 13));
+  ASSERT_EQ(b->rc, allOK);
+  const SumFile& f = onlyFile(*b->root);
+  EXPECT_TRUE(f.functions[0].allDead);
+  EXPECT_FALSE(f.functions[1].allDead);
+  EXPECT_EQ(f.deadFuncs, 1u);
+  EXPECT_EQ(b->root->deadFuncs, 1u);
+  EXPECT_EQ(b->root->dirRecords[0].deadFuncs, 1u);
+}
+
+TEST(SummaryClasses, LinesBetweenTwoOfTheSameClassInAFunctionTakeTheBetweenClass) {
+  auto b = build(
+      "record c.c\n"
+      "function f line=1 calls=1\n"
+      "block 2 hits=1\n"
+      "block 5 hits=1\n"
+      "block 6 hits=0\n"
+      "block 9 hits=0\n"
+      "function g line=12 calls=1\n"
+      "block 13 hits=0\n");
+  ASSERT_EQ(b->rc, allOK);
+  const auto& ls = onlyFile(*b->root).lineStates;
+  std::string classes;
+  for (const LineState& s : ls) classes += char('0' + s.actualClass);
+  // line:     1 2 3 4 5 6 7 8 9 10 11 12 13
+  EXPECT_EQ(classes, "1233245541114");
+}
+
+TEST(SummaryTree, DirectoriesAndFilesAreGroupedAndNativeOrderIsTheRecordOrder) {
+  auto b = build(
+      "record z/b.c\nfunction f line=1\nblock 1\n"
+      "record a/c.c\nfunction f line=1\nblock 1 hits=1\n"
+      "record z/a.c\nfunction f line=1\nblock 1\n"
+      "record top.c\nfunction f line=1\nblock 1\n",
+      {}, 2);
+  ASSERT_EQ(b->rc, allOK);
+  const SumRoot& r = *b->root;
+  EXPECT_EQ(r.dirs, 3u);
+  EXPECT_EQ(r.files, 4u);
+  // Array order is by name; native order by the first record of each directory.
+  EXPECT_STREQ(r.dirRecords[0].name, "**no_directory_provided**/");
+  EXPECT_EQ(dirNames(r), (std::vector<std::string>{"z/", "a/", "**no_directory_provided**/"}));
+  EXPECT_EQ(fileNames(*r.dirOrder[0]), (std::vector<std::string>{"b.c", "a.c"}));
+  EXPECT_EQ(findSumFile(*b->root, "z/a.c"), &r.dirOrder[0]->fileRecords[0]);
+  EXPECT_EQ(findSumFile(*b->root, "top.c"), nullptr);
+  EXPECT_NE(findSumFile(*b->root, "**no_directory_provided**/top.c"), nullptr);
+  EXPECT_EQ(findSumFile(*b->root, "z/"), nullptr);
+}
+
+TEST(SummaryTree, BadMapsGiveCorruptDataAndNoTree) {
+  for (const char* text :
+       {"record a.c\nfunction f line=1\nblock 0x0FFFFFF0\n",       // a line no file has
+        "record a.c\nfunction f line=0x0FFFFFFF\n",
+        "record a.c\nblock 3\n",                              // a block outside a function
+        "record a.c\nfunction f line=1\nblock 2\nentry 2 0\n",  // a file entry among blocks
+        "record a.c\nfunction f line=1\nblockline 2\n"}) {     // blocks start with a line
+    auto b = build(text);
+    EXPECT_EQ(b->rc, corruptKgvFile) << text;
+    EXPECT_EQ(b->root, nullptr);
+  }
+}
+
+TEST(SummaryTree, BlocksOutOfOrderAreSortedOnceInTheData) {
+  const char text[] =
+      "record s.c\n"
+      "function f line=1 calls=1\n"
+      "block 5 hits=5\n"
+      "block 3 hits=3\n"
+      "blockline 4\n"
+      "block 3 hits=7\n";
+  auto b = build(text);
+  ASSERT_EQ(b->rc, allOK);
+  const ObjRecord& rec = *b->data->records[0];
+  EXPECT_EQ(kgtest::describeMap(rec), "F:s.c:1 fn:f:1 fl:1:0 b:3:3 b:3:7 bl:4:0 b:5:5 ");
+  const SumFile& f = onlyFile(*b->root);
+  EXPECT_EQ(f.lineStates[2].count, 7u);  // two blocks on line 3, the larger
+  EXPECT_EQ(f.functions[0].firstLine, 3u);
+  EXPECT_EQ(f.functions[0].lastLine, 5u);
+  // Stable: a second build over the sorted data leaves the map alone.
+  std::string once = kgtest::describeMap(rec);
+  std::unique_ptr<SumRoot> again;
+  ASSERT_EQ(buildSummary(*b->data, 1, hitsMax, {}, again), allOK);
+  EXPECT_EQ(kgtest::describeMap(rec), once);
+}
+
+namespace {
+
+// Files whose counts make the ratio orders interesting: "empty.c" has no lines at all.
+const char kRatios[] =
+    "record d/half.c\nfunction f line=1 calls=1\nblock 2 hits=1\nblock 3 hits=0\n"
+    "record d/empty.c\nfunction g calls=1\n"
+    "record d/full.c\nfunction h line=1 calls=1\nblock 2 hits=1\nblock 3 hits=1\nblock 4 hits=1\n"
+    "record d/none.c\nfunction k line=1 calls=0\nblock 2 hits=0\n";
+
+std::vector<std::string> order(std::uint32_t id) {
+  std::uint32_t parsed = 0;
+  EXPECT_EQ(parseSortOrder(sort_order_name(id), parsed), allOK);
+  auto b = build(kRatios, {}, parsed);
+  EXPECT_EQ(b->rc, allOK);
+  return fileNames(*b->root->dirOrder[0]);
+}
+
+}  // namespace
+
+TEST(SummarySort, RatioOrdersPutItemsWithoutLinesOrBlocksFirstForUsedAndLastForUnused) {
+  const std::vector<std::string> usedFirst = {"empty.c", "full.c", "half.c", "none.c"};
+  const std::vector<std::string> unusedFirst = {"none.c", "half.c", "full.c", "empty.c"};
+  for (std::uint32_t id : {5u, 10u, 15u}) EXPECT_EQ(order(id), usedFirst) << sort_order_name(id);
+  for (std::uint32_t id : {7u, 12u, 17u}) EXPECT_EQ(order(id), unusedFirst) << sort_order_name(id);
+}
+
+TEST(SummarySort, CountOrdersAreDescendingAndEqualCountsGoByName) {
+  EXPECT_EQ(order(1), (std::vector<std::string>{"empty.c", "full.c", "half.c", "none.c"}));
+  EXPECT_EQ(order(2), (std::vector<std::string>{"half.c", "empty.c", "full.c", "none.c"}));
+  EXPECT_EQ(order(3), (std::vector<std::string>{"full.c", "half.c", "none.c", "empty.c"}));
+  EXPECT_EQ(order(4), (std::vector<std::string>{"full.c", "half.c", "empty.c", "none.c"}));
+  // half and none both have one unused line; full and empty none.
+  EXPECT_EQ(order(6), (std::vector<std::string>{"half.c", "none.c", "empty.c", "full.c"}));
+  EXPECT_EQ(order(16), (std::vector<std::string>{"half.c", "none.c", "empty.c", "full.c"}));
+}
+
+TEST(SummarySort, FunctionsOfEqualNameAndCountsGoByTheirPlaceInTheMap) {
+  auto b = build(
+      "record t.c\n"
+      "function f line=1 calls=1\nblock 2 hits=0\n"
+      "function b line=5 calls=1\nblock 6 hits=1\n"
+      "function f line=9 calls=1\nblock 10 hits=0\n",
+      {}, 6);
+  ASSERT_EQ(b->rc, allOK);
+  const SumFile& f = onlyFile(*b->root);
+  ASSERT_EQ(f.funcOrder.size(), 3u);
+  EXPECT_EQ(f.funcOrder[0], &f.functions[0]);
+  EXPECT_EQ(f.funcOrder[1], &f.functions[2]);
+  EXPECT_EQ(f.funcOrder[2], &f.functions[1]);
+  // Re-sorting by name keeps the two "f" in map order.
+  ASSERT_EQ(sortSummary(*b->root, 1), allOK);
+  EXPECT_EQ(b->root->sortOrder, 1u);
+  EXPECT_EQ(f.funcOrder[0], &f.functions[1]);
+  EXPECT_EQ(f.funcOrder[1], &f.functions[0]);
+  EXPECT_EQ(f.funcOrder[2], &f.functions[2]);
+}
+
+TEST(SummarySort, NamesAndComparatorsOfTheTable) {
+  std::uint32_t id = 0;
+  EXPECT_EQ(parseSortOrder("l_unused%", id), allOK);
+  EXPECT_EQ(id, 7u);
+  EXPECT_EQ(parseSortOrder("Alpha", id), invalidSortingOrder);
+  EXPECT_EQ(parseSortOrder("", id), invalidSortingOrder);
+  EXPECT_EQ(parseSortOrder(nullptr, id), invalidSortingOrder);
+  for (std::uint32_t i = 1; i <= 17; ++i) EXPECT_NE(sortComparator(i), nullptr) << i;
+  EXPECT_EQ(sortComparator(0), nullptr);
+  EXPECT_EQ(sortComparator(18), nullptr);
+  SumCounts c;
+  SortKey k{"x", 1, &c, &c};
+  EXPECT_EQ(sortComparator(3)(k, k), 0);
+}
+
+TEST(SummaryViewState, ARebuildKeepsTheStateOfRowsThatStillExist) {
+  auto old = build(
+      "record a/x.c\nfunction f line=1\nblock 1\nfunction g line=3\nblock 3\n"
+      "record b/y.c\nfunction h line=1\nblock 1\n");
+  ASSERT_EQ(old->rc, allOK);
+  SumRoot& o = *old->root;
+  setViewState(o, 0);
+  o.viewState = 1;
+  o.dirRecords[0].viewState = 1;                   // a/ expanded
+  o.dirRecords[0].fileRecords[0].viewState = 1;    // x.c expanded
+  o.dirRecords[0].fileRecords[0].functions[1].viewState = 5;  // g
+  auto fresh = build(
+      "record c/new.c\nfunction n line=1\nblock 1\n"
+      "record a/x.c\nfunction g line=3\nblock 3\nfunction z line=7\nblock 7\n"
+      "record b/y.c\nfunction h line=1\nblock 1\n",
+      {}, 3);
+  ASSERT_EQ(fresh->rc, allOK);
+  SumRoot& n = *fresh->root;
+  setViewState(n, 9);
+  carryViewState(&n, &o, 0);
+  EXPECT_EQ(n.viewState, 1u);
+  SumFile* x = findSumFile(n, "a/x.c");
+  ASSERT_NE(x, nullptr);
+  EXPECT_EQ(x->dir->viewState, 1u);
+  EXPECT_EQ(x->viewState, 1u);
+  EXPECT_EQ(x->functions[0].viewState, 5u);  // g kept its state
+  EXPECT_EQ(x->functions[1].viewState, 0u);  // z is new
+  SumFile* created = findSumFile(n, "c/new.c");
+  EXPECT_EQ(created->dir->viewState, 0u);    // a new directory gets the default
+  EXPECT_EQ(created->viewState, 9u);         // and its rows keep what they had
+  carryViewState(&n, nullptr, 4);
+  EXPECT_EQ(created->functions[0].viewState, 4u);
+  carryViewState(nullptr, &o, 4);  // nothing to do
+}
+
+TEST(SummaryTree, TimesAndTotalsAddUpThroughTheLevels) {
+  auto b = build(
+      "record p/a.c first=100 last=200 sessions=2\nfunction f line=1 calls=0\nblock 1\n"
+      "record p/b.c first=50 last=150\nfunction g line=1 calls=3\nblock 1 hits=1\n"
+      "record q.c first=300 last=400\n");
+  ASSERT_EQ(b->rc, allOK);
+  const SumRoot& r = *b->root;
+  EXPECT_EQ(r.firstTime, 50u);
+  EXPECT_EQ(r.lastTime, 400u);
+  EXPECT_EQ(r.funcs, 2u);
+  EXPECT_EQ(r.unusedFuncs, 1u);
+  EXPECT_EQ(r.counts.lines, 2u);
+  EXPECT_EQ(r.counts.unusedLines, 1u);
+  const SumFile* a = findSumFile(*b->root, "p/a.c");
+  ASSERT_NE(a, nullptr);
+  EXPECT_EQ(a->sessions, 2u);
+  EXPECT_EQ(a->dir->firstTime, 50u);
+  EXPECT_EQ(a->dir->lastTime, 200u);
+}
