@@ -273,6 +273,8 @@ void KG_SumFrame::showData(std::unique_ptr<KgvData> data, std::unique_ptr<SumRoo
 }
 
 void KG_SumFrame::show() {
+  gangContainer_->fitToContents();
+  workArea_->fitToContents();
   window_->show();
   if (KG_SummaryOverall* all = overall()) all->expand();
   outline_->text()->takeFocus();
