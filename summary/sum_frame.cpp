@@ -20,6 +20,7 @@
 #include "summary/name_style.h"
 #include "summary/sort_orders.h"
 #include "summary/sum_dialogs.h"
+#include "summary/sum_timing.h"
 #include "summary/sum_toolbar.h"
 #include "toolkit/oi_application.h"
 #include "toolkit/oi_controls.h"
@@ -256,7 +257,14 @@ void KG_SumFrame::perform(const std::string& actionString) {
     startChangeRequest();
     return;
   }
+  const double start = kgNowMs();
   root_->perform_action(actionString.c_str(), nullptr);
+  if (kgTimingsWanted()) {
+    // The change as drawn: pending drawing is done and the server has it.
+    outline_->text()->redisplay();
+    XSync(XtDisplay(outline_->text()->widget()), False);
+    kgRecordTiming("action " + actionString, kgNowMs() - start);
+  }
   // Keys go back to the outline after a menu or button was used.
   outline_->text()->takeFocus();
 }
@@ -278,6 +286,39 @@ void KG_SumFrame::show() {
   window_->show();
   if (KG_SummaryOverall* all = overall()) all->expand();
   outline_->text()->takeFocus();
+  if (kgTimingsWanted()) startTimings();
+}
+
+namespace {
+
+double gKeyStart = 0;
+
+void keyStarts(Widget, XtPointer, XEvent*, Boolean*) { gKeyStart = kgNowMs(); }
+
+void keyEnds(Widget w, XtPointer client, XEvent* ev, Boolean*) {
+  if (gKeyStart == 0) return;
+  static_cast<OI_MultiText*>(client)->redisplay();
+  XSync(XtDisplay(w), False);
+  char name[64] = "";
+  KeySym sym = NoSymbol;
+  XLookupString(&ev->xkey, name, sizeof name, &sym, nullptr);
+  const char* symName = XKeysymToString(sym);
+  kgRecordTiming(std::string("key ") + (symName ? symName : "?"), kgNowMs() - gKeyStart);
+  gKeyStart = 0;
+}
+
+}  // namespace
+
+void KG_SumFrame::startTimings() {
+  // Once the loop has handled the first drawing, the window is up.
+  OI_Application::instance()->addWorkProc([] {
+    kgRecordTiming("window-up", kgMsSinceProcessStart());
+    return true;
+  });
+  // Keys on the outline: from before its translations to after the change is drawn.
+  Widget w = outline_->text()->widget();
+  XtInsertEventHandler(w, KeyPressMask, False, keyStarts, nullptr, XtListHead);
+  XtInsertEventHandler(w, KeyPressMask, False, keyEnds, outline_->text(), XtListTail);
 }
 
 void KG_SumFrame::placeHeadings() {

@@ -85,6 +85,7 @@ class KG_SumFrame {
   void askAndAddDataFile();
   void askAndSaveOutline();
   void showVersion();
+  void startTimings();
 
   StartupState& state_;
   std::unique_ptr<OI_TopLevel> window_;
