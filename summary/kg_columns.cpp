@@ -56,11 +56,15 @@ const std::vector<KG_GroupTitle>& kgGroupTitles() {
   return titles;
 }
 
-bool kgColumnShownBySettings(const KG_Column& c) {
-  if (c.resource == nullptr) return true;
-  if (c.resource[0] == '\0') return false;
+namespace {
+
+// The switch of each column of the table, found once per settings table.
+const std::vector<const KG_BoolResource*>& columnSwitches() {
+  static const KG_Settings* forTable = nullptr;
+  static std::vector<const KG_BoolResource*> switches;
   KG_Settings& s = kgSettings();
-  const KG_BoolResource* switches[] = {
+  if (forTable == &s) return switches;
+  const KG_BoolResource* all[] = {
       &s.showNumberOfDirectories, &s.showNumberOfFiles, &s.showCompilationDate,
       &s.showNumberOfRuns, &s.showOldestSessionDate, &s.showNewestSessionDate,
       &s.showRealTime, &s.showCpuTime, &s.showNumberOfCalls, &s.showFunctionsUnused,
@@ -73,10 +77,28 @@ bool kgColumnShownBySettings(const KG_Column& c) {
       &s.showTotalAdjustments, &s.showBlocksUnused, &s.showBlocksPercentUnused,
       &s.showBlocksUsed, &s.showBlocksPercentUsed, &s.showBlocksTotal,
   };
-  for (const KG_BoolResource* r : switches) {
-    if (std::string(r->name()) == c.resource) return r->value;
+  switches.clear();
+  for (const KG_Column& c : kgColumnTable()) {
+    const KG_BoolResource* found = nullptr;
+    if (c.resource != nullptr) {
+      for (const KG_BoolResource* r : all) {
+        if (std::string(r->name()) == c.resource) found = r;
+      }
+    }
+    switches.push_back(found);
   }
-  return false;
+  forTable = &s;
+  return switches;
+}
+
+}  // namespace
+
+bool kgColumnShownBySettings(const KG_Column& c) {
+  if (c.resource == nullptr) return true;
+  const std::size_t index = static_cast<std::size_t>(&c - kgColumnTable().data());
+  const auto& switches = columnSwitches();
+  if (index >= switches.size() || switches[index] == nullptr) return false;
+  return switches[index]->value;
 }
 
 std::vector<KG_ShownColumn> kgShownColumns(unsigned nameWidth, bool (*shown)(const KG_Column&)) {
@@ -94,6 +116,25 @@ std::vector<KG_ShownColumn> kgShownColumns(unsigned nameWidth, bool (*shown)(con
 std::vector<KG_ShownColumn> kgShownColumns() {
   return kgShownColumns(static_cast<unsigned>(kgSettings().nameColumnWidth.value),
                         &kgColumnShownBySettings);
+}
+
+const std::vector<KG_ShownColumn>& kgShownColumnsCached() {
+  // Rows ask for every line they build: the answer is kept while the choice is the same.
+  static std::vector<KG_ShownColumn> cached;
+  static std::vector<bool> cachedShown;
+  static unsigned cachedWidth = 0;
+  static bool valid = false;
+  const unsigned width = static_cast<unsigned>(kgSettings().nameColumnWidth.value);
+  std::vector<bool> shown;
+  shown.reserve(kColumnCount);
+  for (const KG_Column& c : kgColumnTable()) shown.push_back(kgColumnShownBySettings(c));
+  if (!valid || width != cachedWidth || shown != cachedShown) {
+    cached = kgShownColumns(width, &kgColumnShownBySettings);
+    cachedShown = std::move(shown);
+    cachedWidth = width;
+    valid = true;
+  }
+  return cached;
 }
 
 std::uint32_t kgShownWidth(const std::vector<KG_ShownColumn>& shown) {

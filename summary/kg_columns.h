@@ -51,6 +51,8 @@ struct KG_ShownColumn {
 
 // The shown columns from the settings (column switches and the name column width).
 std::vector<KG_ShownColumn> kgShownColumns();
+// The same, kept between calls while the settings choose the same columns.
+const std::vector<KG_ShownColumn>& kgShownColumnsCached();
 // The same from an explicit choice: shown(id) says whether a column is shown.
 std::vector<KG_ShownColumn> kgShownColumns(unsigned nameWidth, bool (*shown)(const KG_Column&));
 // Whether the settings show a column.

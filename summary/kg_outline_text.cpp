@@ -105,7 +105,7 @@ KG_OutlineText* KG_OutlineText::parent_text() const {
 }
 
 std::string KG_OutlineText::build_line() {
-  const std::vector<KG_ShownColumn> shown = kgShownColumns();
+  const std::vector<KG_ShownColumn>& shown = kgShownColumnsCached();
   std::string line;
   line.reserve(kgShownWidth(shown));
   QR_OutlineDisplay* d = display();
@@ -148,6 +148,22 @@ void KG_OutlineText::refresh_subtree() {
 void KG_OutlineText::expand() {
   create_children();
   QR_OutlineText::expand();
+}
+
+void KG_OutlineText::expand_all() {
+  QR_OutlineRoot* r = root();
+  if (r == nullptr || !is_expandable_or_collapsible()) return;
+  const bool was = r->hold_updates();
+  const bool shown = is_displayed();
+  if (shown && is_expanded()) collapse();
+  create_children();
+  // While this row is closed its descendants are out of sight: opening them draws nothing.
+  for (std::uint32_t i = 0; i < child_count(); ++i) {
+    QR_OutlineObject* c = child_row(i);
+    if (c->is_expandable_or_collapsible()) c->expand_all();
+  }
+  expand();
+  r->release_updates(was);
 }
 
 bool KG_OutlineText::common_cell(std::uint32_t column, std::string& out, std::uint32_t width) {

@@ -49,6 +49,9 @@ class KG_OutlineText : public QR_OutlineText {
   virtual void refresh();
 
   void expand() override;
+  // The whole subtree opened out of sight, then shown with one insertion: a display makes
+  // room for the lines once instead of once per row.
+  void expand_all() override;
   // The row's line from the shown columns.
   std::string build_line();
   // Builds the line for a row that has none yet (before it joins the outline).

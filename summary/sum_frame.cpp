@@ -297,14 +297,20 @@ void keyStarts(Widget, XtPointer, XEvent*, Boolean*) { gKeyStart = kgNowMs(); }
 
 void keyEnds(Widget w, XtPointer client, XEvent* ev, Boolean*) {
   if (gKeyStart == 0) return;
-  static_cast<OI_MultiText*>(client)->redisplay();
-  XSync(XtDisplay(w), False);
   char name[64] = "";
   KeySym sym = NoSymbol;
   XLookupString(&ev->xkey, name, sizeof name, &sym, nullptr);
   const char* symName = XKeysymToString(sym);
-  kgRecordTiming(std::string("key ") + (symName ? symName : "?"), kgNowMs() - gKeyStart);
-  gKeyStart = 0;
+  const std::string what = std::string("key ") + (symName ? symName : "?");
+  auto* text = static_cast<OI_MultiText*>(client);
+  Display* d = XtDisplay(w);
+  // Right after the key's own handling is over: what it changed, drawn and at the server.
+  OI_Application::instance()->addTimeOut(0, [text, d, what] {
+    text->redisplay();
+    XSync(d, False);
+    kgRecordTiming(what, kgNowMs() - gKeyStart);
+    gKeyStart = 0;
+  });
 }
 
 }  // namespace
