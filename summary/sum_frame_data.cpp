@@ -4,6 +4,8 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <fnmatch.h>
+
 #include <csignal>
 
 #include "adjust/adjustments_file.h"
@@ -17,6 +19,7 @@
 #include "outline/qr_oi_outline_display.h"
 #include "settings/resource_database.h"
 #include "settings/resource_table.h"
+#include "settings/settings_startup.h"
 #include "settings/settings_writer.h"
 #include "startup/atomic_write.h"
 #include "startup/diagnostic.h"
@@ -204,6 +207,23 @@ namespace {
 
 XtSignalId gTermSignal = 0;
 
+// Toolkit warnings that say nothing a user can act on are not shown.
+const char* const kFilteredMessages[] = {"*invalid size*", "*specified location is invalid*"};
+
+bool filteredMessage(const char* message) {
+  for (const char* pattern : kFilteredMessages) {
+    if (fnmatch(pattern, message ? message : "", 0) == 0) return true;
+  }
+  return false;
+}
+
+XtErrorHandler gPreviousWarningHandler = nullptr;
+
+void filteringWarningHandler(String message) {
+  if (filteredMessage(message)) return;
+  if (gPreviousWarningHandler != nullptr) gPreviousWarningHandler(message);
+}
+
 void termHandler(int) {
   if (gTermSignal != 0) XtNoticeSignal(gTermSignal);
 }
@@ -221,6 +241,9 @@ ErrorCode runMainWindow(StartupState& state, StartupSummary& prepared) {
   }
   OI_Application* app = OI_Application::instance();
   QR_OI_Init();
+  gPreviousWarningHandler = XtAppSetWarningHandler(app->context(), filteringWarningHandler);
+  // Java data take the Java wording of messages and labels.
+  if (state.isJava) mergeJavaResourceFiles(state.installDir);
   if (XrmDatabase db = resourceDatabase()) {
     app->installDatabase(db, true);
     handOverResourceDatabase();

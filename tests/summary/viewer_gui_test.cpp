@@ -160,6 +160,39 @@ TEST_F(ViewerWindow, ViewMenuSortsDrawsSeparatorsAndHidesTheToolbar) {
   EXPECT_EQ(last.find("kgView.kgToolbarToggle")->field("label"), "Make toolbar visible");
 }
 
+TEST_F(ViewerWindow, AFileOpenedFromTheMenuJoinsTheDataAndTheSameFileTwiceIsRefused) {
+  std::string error;
+  ASSERT_TRUE(makeKgvFile("generate records=2 first=300 functions=2 blocks=3 seed=9\n", dir.file("more.kgv"), error));
+  auto openFile = [&](const std::string& path) {
+    clickWidget("kgFilePulldown");
+    clickWidget("kgFile.kgOpen");
+    clickWidget("kgFileDialog.Text");
+    // The name field starts with the current directory: it is erased and the whole name typed.
+    GuiState now = app->state();
+    const WidgetInfo* field = now.find("kgFileDialog.Text");
+    ASSERT_NE(field, nullptr);
+    app->key("End");
+    const size_t typed = field->field("value").size();
+    if (typed > 0) app->xdotool({"key", "--repeat", std::to_string(typed), "BackSpace"});
+    app->xdotool({"type", path});
+    ASSERT_TRUE(app->waitFor([&](const GuiState& st) {
+      const WidgetInfo* f = st.find("kgFileDialog.Text");
+      return f && f->field("value") == path;
+    }, &last)) << last.raw().substr(0, 400);
+    clickWidget("kgFileDialog.OK");
+  };
+  openFile(dir.file("more.kgv"));
+  // A fourth directory, and the totals count its functions too.
+  ASSERT_TRUE(waitLineCount(5)) << app->errorOutput();
+  EXPECT_NE(outlineLines()[4].find("gen/dir3/"), std::string::npos) << last.raw();
+
+  openFile(dir.file("more.kgv"));
+  ASSERT_TRUE(app->waitViewable("kgErrorDialog", &last)) << last.raw();
+  EXPECT_NE(last.raw().find("Use 'Reload all' to reread previously loaded data."), std::string::npos);
+  clickWidget("kgErrorDialog.kgOK");
+  EXPECT_EQ(outlineLines().size(), 5u);
+}
+
 TEST_F(ViewerWindow, ExitMakesThePersonalSettingsFileFromItsTemplate) {
   clickWidget("kgFilePulldown");
   clickWidget("kgFile.kgExit");
