@@ -105,6 +105,11 @@ ErrorCode FileCounter::scanBlocks(SumFunc& fn, std::size_t start, std::size_t en
     std::stable_sort(entries.begin(), entries.end(), [](const auto& a, const auto& b) {
       return mapValue(a.first) < mapValue(b.first);
     });
+    // Block lines below every block line number would now lead the run, and the next build
+    // would reject the map it just wrote: the first block leads instead, those lines after it.
+    auto firstBlock = std::find_if(entries.begin(), entries.end(),
+                                   [](const auto& e) { return mapTag(e.first) == TagBlock; });
+    std::rotate(entries.begin(), firstBlock, firstBlock + 1);
     for (std::size_t k = 0; k < places.size(); ++k) {
       map_[places[k]] = entries[k].first;
       if (places[k] < counts_.size()) counts_[places[k]] = entries[k].second;

@@ -46,7 +46,8 @@ void carryViewState(SumRoot* newRoot, const SumRoot* oldRoot, std::uint32_t defa
 SumFile* findSumFile(SumRoot& root, const std::string& path);
 
 // The line states of a file: those of the tree when it has them, else made on request
-// (into a buffer reused for the next file) from the adjustments and the hits policy.
+// (into a buffer reused for the next file) from the adjustments and the hits policy. The
+// adjustment list must not change while this lives.
 class LazyLineStates {
  public:
   LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy);

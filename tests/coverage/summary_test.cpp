@@ -3,7 +3,9 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <random>
 
+#include "adjust/export_report.h"
 #include "coverage/summary_build.h"
 #include "coverage/summary_sort.h"
 #include "summary/sort_orders.h"
@@ -245,6 +247,23 @@ TEST(SummaryTree, BadMapsGiveCorruptDataAndNoTree) {
   }
 }
 
+TEST(SummaryTree, ABlockLineBeforeItsBlockNeverMakesTheSortedDataUnreadable) {
+  const char text[] =
+      "record s.c\n"
+      "function f line=1 calls=1\n"
+      "block 5 hits=5\n"
+      "blockline 3\n"
+      "block 4 hits=0\n";
+  auto b = build(text);
+  ASSERT_EQ(b->rc, allOK);
+  const ObjRecord& rec = *b->data->records[0];
+  EXPECT_EQ(kgtest::describeMap(rec), "F:s.c:1 fn:f:1 fl:1:0 b:4:0 bl:3:0 b:5:5 ");
+  std::unique_ptr<SumRoot> again;
+  ASSERT_EQ(buildSummary(*b->data, 1, hitsMax, {}, again), allOK);
+  EXPECT_EQ(kgtest::describeMap(rec), "F:s.c:1 fn:f:1 fl:1:0 b:4:0 bl:3:0 b:5:5 ");
+  EXPECT_EQ(recomputeSummary(*again, hitsMax, {}), allOK);
+}
+
 TEST(SummaryTree, BlocksOutOfOrderAreSortedOnceInTheData) {
   const char text[] =
       "record s.c\n"
@@ -393,4 +412,82 @@ TEST(SummaryTree, TimesAndTotalsAddUpThroughTheLevels) {
   EXPECT_EQ(a->sessions, 2u);
   EXPECT_EQ(a->dir->firstTime, 50u);
   EXPECT_EQ(a->dir->lastTime, 200u);
+}
+
+namespace {
+
+// A record with a random map: mostly plausible entries, some of any tag, lines up to the
+// largest a map can hold, counts of any size.
+std::unique_ptr<ObjRecord> randomRecord(std::mt19937& rng, int n) {
+  auto r = std::make_unique<ObjRecord>();
+  std::string names = "d" + std::to_string(n % 3) + "/f" + std::to_string(n % 5) + ".c";
+  names.push_back('\0');
+  names += "fn";
+  names.push_back('\0');
+  r->strings.assign(names.begin(), names.end());
+  r->fileNameOffset = 0;
+  std::uniform_int_distribution<int> pick(0, 99);
+  std::uniform_int_distribution<std::uint32_t> any(0, 0x0FFFFFFF);
+  std::uniform_int_distribution<std::uint32_t> small(0, 60);
+  auto add = [&](std::uint32_t tag, std::uint32_t value) {
+    r->map.push_back(makeMapEntry(tag, value));
+    r->counts.push_back(static_cast<std::uint16_t>(pick(rng) < 40 ? 0 : any(rng)));
+  };
+  if (pick(rng) < 98) add(TagFile, 0);
+  int functions = pick(rng) % 5;
+  for (int f = 0; f < functions; ++f) {
+    add(TagFunction, pick(rng) < 2 ? any(rng) : std::uint32_t(names.find("fn")));
+    if (pick(rng) < 80) add(TagFuncLine, pick(rng) < 2 ? any(rng) : small(rng));
+    int blocks = pick(rng) % 7;
+    for (int b = 0; b < blocks; ++b) {
+      int p = pick(rng);
+      if (p < 2) add(std::uint32_t(pick(rng) % 16), any(rng));   // anything at all
+      else if (p < 4) add(TagEmpty, 0);
+      else if (p < 6) add(TagBlock, any(rng));                     // a line far away
+      else add(b == 0 || p < 70 ? TagBlock : TagBlockLine, small(rng));
+    }
+  }
+  r->objHeader.mapCount = static_cast<std::uint32_t>(r->map.size());
+  return r;
+}
+
+}  // namespace
+
+TEST(SummaryTree, DamagedMapsGiveCorruptDataOrATreeButNeverACrash) {
+  std::mt19937 rng(12345);
+  AdjustmentList adj = adjustments("d1/f1.c", adjRangeDead, 3, 20);
+  int trees = 0, corrupt = 0;
+  for (int round = 0; round < 400; ++round) {
+    KgvData data;
+    for (int k = 0; k < 4; ++k) data.records.push_back(randomRecord(rng, round + k));
+    std::unique_ptr<SumRoot> root;
+    ErrorCode rc = buildSummary(data, 1 + round % 17, 1 + round % 4, adj, root);
+    if (rc == allOK) {
+      ++trees;
+      ASSERT_NE(root, nullptr);
+      for (const SumDir& d : root->dirRecords)
+        for (const SumFile& f : d.fileRecords) {
+          ASSERT_EQ(f.lineStates.size(), f.lineCount);
+          for (const SumFunc& fn : f.functions) ASSERT_LE(fn.lastLine, f.lineCount);
+        }
+      ASSERT_EQ(recomputeSummary(*root, hitsMin, AdjustmentList{}), allOK);
+      // A second build over the data as the first one left it succeeds too.
+      std::unique_ptr<SumRoot> again;
+      ASSERT_EQ(buildSummary(data, 1, hitsMax, adj, again), allOK);
+      // And the report is written from either tree, the second making line states as it goes.
+      std::unique_ptr<SumRoot> lazy;
+      ASSERT_EQ(buildSummary(data, 1, hitsMax, adj, lazy, false), allOK);
+      FILE* sink = fopen("/dev/null", "w");
+      ASSERT_NE(sink, nullptr);
+      EXPECT_EQ(writeExport(sink, *again), allOK);
+      EXPECT_EQ(writeExport(sink, *lazy), allOK);
+      fclose(sink);
+    } else {
+      ++corrupt;
+      ASSERT_EQ(rc, corruptKgvFile);
+      ASSERT_EQ(root, nullptr);
+    }
+  }
+  EXPECT_GT(trees, 20);
+  EXPECT_GT(corrupt, 20);
 }
