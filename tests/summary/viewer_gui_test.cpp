@@ -203,5 +203,28 @@ TEST_F(ViewerWindow, ExitMakesThePersonalSettingsFileFromItsTemplate) {
   EXPECT_TRUE(made.good());
 }
 
+// Two data files of which the first holds an older build of one source file.
+TEST(ViewerNotes, OutOfDateDataAreListedInTheNoteWindowWhenTheViewerOpens) {
+  XvfbServer server;
+  ASSERT_FALSE(server.display().empty());
+  TempDir dir;
+  std::string error;
+  ASSERT_TRUE(makeKgvFile("record src/a.c signature=1 build=100\nfunction fa line=1 calls=1\nblock 2 hits=1\n"
+                          "record src/b.c signature=1 build=100\nfunction fb line=1 calls=0\nblock 2 hits=0\n",
+                          dir.file("old.kgv"), error)) << error;
+  ASSERT_TRUE(makeKgvFile("record src/a.c signature=2 build=200\nfunction fa line=1 calls=2\nblock 2 hits=2\n",
+                          dir.file("new.kgv"), error)) << error;
+  GuiApp app(server, {buildDir() + "/tests/viewer_probe", dir.file("old.kgv"), dir.file("new.kgv")},
+             {"HOME=" + dir.path(), "KESTREL_HOME=" + buildDir()});
+  GuiState s;
+  ASSERT_TRUE(app.waitViewable("kgErrorList", &s)) << app.errorOutput() << s.raw();
+  EXPECT_NE(s.raw().find("label=\"Some coverage for this file was out of date:\""), std::string::npos) << s.raw();
+  EXPECT_NE(s.raw().find("  item: src/a.c\n"), std::string::npos) << s.raw();
+  // The window lists the one directory with both files, the newer data of a.c counted.
+  ASSERT_TRUE(app.waitFor([](const GuiState& st) { return st.find("kgOutline") && st.find("kgOutline")->lines.size() == 2; },
+                          &s));
+  EXPECT_EQ(app.stop(), 0) << app.errorOutput();
+}
+
 }  // namespace
 }  // namespace kgtest
