@@ -111,7 +111,7 @@ class KG_SumFrame {
 KG_SumFrame* kgSumFrame();
 
 // Start-up hands over here once the data are loaded and summarised: the toolkit opens the
-// display with the settings' resource database, the window is built and shown with the data,
+// display (unless start-up opened it already) with the settings' resource database, the window is built and shown with the data,
 // the load notes and adjustment problems are shown, and the event loop runs until exit.
 // Returns 1 on a normal exit, else the code of what failed.
 ErrorCode runMainWindow(StartupState& state, StartupSummary& prepared);

@@ -235,7 +235,9 @@ ErrorCode runMainWindow(StartupState& state, StartupSummary& prepared) {
   std::string programName = "kestrel";
   char* argv[] = {programName.data(), nullptr};
   int argc = 1;
-  if (!OI_Application::open(argc, argv, error)) {
+  // Start-up may have opened the toolkit already at its display step (taking the X options
+  // out of the command line then); otherwise it opens here on DISPLAY.
+  if (OI_Application::instance() == nullptr && !OI_Application::open(argc, argv, error)) {
     reportError(displayNotOpened, "%s\n", error.c_str());
     return displayNotOpened;
   }
