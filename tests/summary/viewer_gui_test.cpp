@@ -193,6 +193,20 @@ TEST_F(ViewerWindow, AFileOpenedFromTheMenuJoinsTheDataAndTheSameFileTwiceIsRefu
   EXPECT_EQ(outlineLines().size(), 5u);
 }
 
+TEST_F(ViewerWindow, ReloadAllReadsTheChangedFileAndKeepsOpenRowsOpen) {
+  clickCell(1, 10);
+  app->key("Right");
+  ASSERT_TRUE(waitLineCount(4 + 6));
+  // The data file is rewritten with one more directory, as a new test run would.
+  std::string error;
+  ASSERT_TRUE(makeKgvFile(std::string(kData) + "generate records=1 first=400 functions=1 blocks=2 seed=4\n",
+                          dir.file("app.kgv"), error)) << error;
+  clickWidget("kgFilePulldown");
+  clickWidget("kgFile.kgReloadAll");
+  ASSERT_TRUE(waitLineCount(4 + 6 + 1)) << app->errorOutput();
+  EXPECT_NE(outlineLines().back().find("gen/dir4/"), std::string::npos) << last.raw();
+}
+
 TEST_F(ViewerWindow, ExitMakesThePersonalSettingsFileFromItsTemplate) {
   clickWidget("kgFilePulldown");
   clickWidget("kgFile.kgExit");
