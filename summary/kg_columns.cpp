@@ -119,18 +119,23 @@ std::vector<KG_ShownColumn> kgShownColumns() {
 }
 
 const std::vector<KG_ShownColumn>& kgShownColumnsCached() {
-  // Rows ask for every line they build: the answer is kept while the choice is the same.
+  // Rows ask for every line they build: the answer is kept while the choice is the same, and
+  // the check is one look at each switch.
   static std::vector<KG_ShownColumn> cached;
-  static std::vector<bool> cachedShown;
+  static bool cachedShown[kColumnCount] = {};
   static unsigned cachedWidth = 0;
   static bool valid = false;
   const unsigned width = static_cast<unsigned>(kgSettings().nameColumnWidth.value);
-  std::vector<bool> shown;
-  shown.reserve(kColumnCount);
-  for (const KG_Column& c : kgColumnTable()) shown.push_back(kgColumnShownBySettings(c));
-  if (!valid || width != cachedWidth || shown != cachedShown) {
+  const auto& switches = columnSwitches();
+  bool same = valid && width == cachedWidth && switches.size() == kColumnCount;
+  for (std::size_t i = 0; same && i < kColumnCount; ++i) {
+    same = cachedShown[i] == (switches[i] != nullptr && switches[i]->value);
+  }
+  if (!same) {
     cached = kgShownColumns(width, &kgColumnShownBySettings);
-    cachedShown = std::move(shown);
+    for (std::size_t i = 0; i < kColumnCount && i < switches.size(); ++i) {
+      cachedShown[i] = switches[i] != nullptr && switches[i]->value;
+    }
     cachedWidth = width;
     valid = true;
   }
