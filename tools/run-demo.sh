@@ -20,3 +20,5 @@ echo "== Unused lines"
 "$kestrel" -export "$adjust" "$kgv" | "$build/scripts/unused-lines"
 echo
 echo "Data file: $kgv"
+echo
+"$here/demo-viewer.sh" "$build" "$kgv" "$adjust"

@@ -1,0 +1,283 @@
+// The main window's operations on data and files: adding and reloading data files, writing
+// data, export, outline and settings files, extraction, and the start-up hand-over.
+#include <Xm/Xm.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <fnmatch.h>
+
+#include <csignal>
+
+#include "adjust/adjustments_file.h"
+#include "adjust/export_report.h"
+#include "adjust/extraction.h"
+#include "coverage/kgv_file.h"
+#include "coverage/kgv_load.h"
+#include "coverage/kgv_lock.h"
+#include "coverage/kgv_merge.h"
+#include "outline/qr_oi_multi_text.h"
+#include "outline/qr_oi_outline_display.h"
+#include "settings/resource_database.h"
+#include "settings/resource_table.h"
+#include "settings/settings_startup.h"
+#include "settings/settings_writer.h"
+#include "startup/atomic_write.h"
+#include "startup/diagnostic.h"
+#include "summary/kg_outline_text.h"
+#include "summary/name_style.h"
+#include "summary/sum_dialogs.h"
+#include "summary/sum_frame.h"
+#include "toolkit/oi_application.h"
+#include "toolkit/oi_dialogs.h"
+#include "toolkit/oi_window.h"
+
+namespace {
+
+// The busy box and pointer around one operation, ended on every path.
+class BusyScope {
+ public:
+  BusyScope(KG_SumFrame& f, const char* message) : f_(f) {
+    f_.begin_busy(message);
+    OI_Application::instance()->beginBusyPointer();
+  }
+  ~BusyScope() {
+    OI_Application::instance()->endBusyPointer();
+    f_.end_busy();
+  }
+  BusyScope(const BusyScope&) = delete;
+  BusyScope& operator=(const BusyScope&) = delete;
+
+ private:
+  KG_SumFrame& f_;
+};
+
+// Out-of-date notes and other load results, as after start-up and after a reload.
+void reportLoadResult(ErrorCode status, const std::vector<std::string>& ignored) {
+  KG_Settings& s = kgSettings();
+  if (status == allOK || !s.showMergeWarnings.value) return;
+  if (!ignored.empty() && s.showMergeWarningDetails.value) {
+    noteList(ignored.size() == 1 ? "Some coverage for this file was out of date:"
+                                 : "Some coverage for these files was out of date:",
+             ignored);
+  } else {
+    show_message(OI_Severity::warning, errorMessage(status));
+  }
+}
+
+bool askFile(const char* prompt, std::string& chosen) {
+  return oiAskFileName(kgDialogHome(), "kgFileDialog", "Kestrelgauge", prompt, "", chosen) && !chosen.empty();
+}
+
+class WindowQuestion : public ExtractionQuestion {
+ public:
+  bool continueWith(const std::string& message) override { return ask_continue(message); }
+};
+
+}  // namespace
+
+void KG_SumFrame::reload_all() {
+  KG_SummaryOverall* all = overall();
+  if (all == nullptr || state_.loadedFiles.empty()) return;
+  BusyScope busy(*this, kgSettings().loadingKgvDataBusyMsg.c_str());
+  std::vector<std::string> ignored;
+  std::unique_ptr<KgvData> data;
+  std::size_t failed = 0;
+  ErrorCode rc = loadAllKgvFiles(state_.loadedFiles, state_.mergeMode, &ignored, data, failed);
+  if (rc != allOK && rc != mergeIgnored) {
+    std::string name = failed < state_.loadedFiles.size() ? state_.loadedFiles[failed].givenName : "";
+    show_error(rc, kgMessageText("cannotReloadFiles", "Couldn't reload files due to problem reloading\n") +
+                       shorten_path_leftmost(name, 80));
+    return;
+  }
+  std::sort(ignored.begin(), ignored.end());
+  ignored.erase(std::unique(ignored.begin(), ignored.end()), ignored.end());
+  reportLoadResult(rc, ignored);
+  all->replace_data(std::move(data));
+}
+
+void KG_SumFrame::add_data_file(const std::string& path) {
+  KG_SummaryOverall* all = overall();
+  if (all == nullptr) return;
+  BusyScope busy(*this, kgSettings().loadingKgvDataBusyMsg.c_str());
+  KgvFileRef ref = makeKgvFileRef(path);
+  if (findKgvFileRef(state_.loadedFiles, ref.resolvedName) >= 0) {
+    show_message(OI_Severity::error, errorDialogText(duplicateFile, kgMessageText("cannotOpenFile", "Can't open requested file")) +
+                                         "\nUse 'Reload all' to reread previously loaded data.");
+    return;
+  }
+  std::unique_ptr<KgvData> added;
+  ErrorCode rc = loadKgvFile(ref, added);
+  if (rc != allOK) {
+    if (rc != lockAborted) show_error(rc, kgMessageText("cannotOpenFile", "Can't load requested file"));
+    return;
+  }
+  std::vector<std::string> ignored;
+  std::unique_ptr<KgvData> merged;
+  rc = mergeKgvDataCopy(state_.mergeMode, all->data(), *added, &ignored, merged);
+  if ((rc != allOK && rc != mergeIgnored) || !merged) {
+    show_error(rc, kgMessageText("cannotCombineData", "Couldn't combine new data with data already loaded"));
+    return;
+  }
+  reportLoadResult(rc, ignored);
+  if (all->replace_data(std::move(merged)) == allOK) state_.loadedFiles.push_back(ref);
+}
+
+void KG_SumFrame::askAndAddDataFile() {
+  std::string path;
+  if (askFile(kgSettings().openKgvFilePrompt.c_str(), path)) add_data_file(path);
+}
+
+void KG_SumFrame::writeKgvTo() {
+  std::string path;
+  KG_SummaryOverall* all = overall();
+  if (all == nullptr || !askFile(kgSettings().saveKgvFilePrompt.c_str(), path)) return;
+  ErrorCode rc = writeKgvFile(path, all->data());
+  if (rc != allOK) show_error(rc, "Couldn't write the file");
+}
+
+void KG_SumFrame::writeExportTo() {
+  std::string path;
+  KG_SummaryOverall* all = overall();
+  if (all == nullptr || !askFile(kgSettings().exportKgvFilePrompt.c_str(), path)) return;
+  ErrorCode rc = exportToFile(all->summary(), path);
+  if (rc != allOK) show_error(rc, "Couldn't export");
+}
+
+ErrorCode KG_SumFrame::save_outline(const std::string& path) {
+  AtomicFileWriter out;
+  ErrorCode rc = out.open(path);
+  if (rc != allOK) return rc;
+  // The summary as shown: the heading lines, then every line of the outline with its indentation.
+  for (const std::string& l : heading_lines()) fprintf(out.stream(), "%s\n", l.c_str());
+  for (std::uint32_t i = 0; i < root_->total_lines(); ++i) {
+    QR_OutlineObject* row = root_->object_at_line(i);
+    if (row == nullptr) continue;
+    const char* text = row->line_text(i - row->first_line());
+    const std::string indent(display_->text_column(row->depth()), ' ');
+    fprintf(out.stream(), "%s%s\n", indent.c_str(), text ? text : "");
+  }
+  return out.commit();
+}
+
+void KG_SumFrame::askAndSaveOutline() {
+  std::string path;
+  if (!askFile(kgSettings().saveOutlinePrompt.c_str(), path)) return;
+  ErrorCode rc = save_outline(path);
+  if (rc != allOK) show_error(rc, "File: " + path);
+}
+
+void KG_SumFrame::updateUserDefaultsFile() {
+  SettingsOutcome o;
+  {
+    BusyScope busy(*this, nullptr);
+    o = updateUserDefaults(state_.installDir);
+  }
+  for (const std::string& w : o.consoleWarnings) kgWarning("%s", w.c_str());
+  if (o.code != allOK) show_error(o.code, o.context);
+  else if (!o.notice.empty()) show_message(OI_Severity::information, o.notice);
+}
+
+void KG_SumFrame::writeViewSettingsTo() {
+  std::string path;
+  if (!askFile(kgMessageText("writeXdefaultsPrompt", "Write viewer settings to file:").c_str(), path)) return;
+  SettingsOutcome o = writeViewSettings(path);
+  for (const std::string& w : o.consoleWarnings) kgWarning("%s", w.c_str());
+  if (o.code != allOK) show_error(o.code, "File: " + path + "\n" + o.context);
+}
+
+void KG_SumFrame::extract_adjustments() {
+  KG_SummaryOverall* all = overall();
+  if (all == nullptr) return;
+  WindowQuestion question;
+  ExtractionOutcome o;
+  {
+    BusyScope busy(*this, nullptr);
+    o = extractAllAdjustments(all->summary(), "", question);
+  }
+  if (!o.performed) return;
+  all->refresh_subtree();
+  if (!o.lines.empty()) noteList("Results from extraction:", o.lines);
+  if (o.writeStatus != allOK) show_error(o.writeStatus, "Couldn't write the adjustments file " + adjustmentsFilePath());
+  if (o.recomputeStatus != allOK) show_error(o.recomputeStatus, "Couldn't summarize information");
+}
+
+// ---- the hand-over from start-up
+
+namespace {
+
+XtSignalId gTermSignal = 0;
+
+// Toolkit warnings that say nothing a user can act on are not shown.
+const char* const kFilteredMessages[] = {"*invalid size*", "*specified location is invalid*"};
+
+bool filteredMessage(const char* message) {
+  for (const char* pattern : kFilteredMessages) {
+    if (fnmatch(pattern, message ? message : "", 0) == 0) return true;
+  }
+  return false;
+}
+
+XtErrorHandler gPreviousWarningHandler = nullptr;
+
+void filteringWarningHandler(String message) {
+  if (filteredMessage(message)) return;
+  if (gPreviousWarningHandler != nullptr) gPreviousWarningHandler(message);
+}
+
+void termHandler(int) {
+  if (gTermSignal != 0) XtNoticeSignal(gTermSignal);
+}
+
+}  // namespace
+
+ErrorCode runMainWindow(StartupState& state, StartupSummary& prepared) {
+  std::string error;
+  std::string programName = "kestrel";
+  char* argv[] = {programName.data(), nullptr};
+  int argc = 1;
+  // Start-up may have opened the toolkit already at its display step (taking the X options
+  // out of the command line then); otherwise it opens here on DISPLAY.
+  if (OI_Application::instance() == nullptr && !OI_Application::open(argc, argv, error)) {
+    reportError(displayNotOpened, "%s\n", error.c_str());
+    return displayNotOpened;
+  }
+  OI_Application* app = OI_Application::instance();
+  QR_OI_Init();
+  gPreviousWarningHandler = XtAppSetWarningHandler(app->context(), filteringWarningHandler);
+  // Java data take the Java wording of messages and labels.
+  if (state.isJava) mergeJavaResourceFiles(state.installDir);
+  if (XrmDatabase db = resourceDatabase()) {
+    app->installDatabase(db, true);
+    handOverResourceDatabase();
+  }
+  // A polite end on SIGTERM: the windows go down in order and the event loop returns.
+  gTermSignal = XtAppAddSignal(app->context(), [](XtPointer, XtSignalId*) { OI_Application::instance()->quit(); },
+                               nullptr);
+  struct sigaction sa {};
+  sa.sa_handler = termHandler;
+  sigemptyset(&sa.sa_mask);
+  struct sigaction old {};
+  sigaction(SIGTERM, &sa, &old);
+
+  ErrorCode result = allOK;
+  {
+    KG_SumFrame frame(state);
+    ErrorCode rc = frame.build(error);
+    if (rc != allOK) {
+      reportError(rc, "Couldn't construct viewer window:\n%s\n", error.c_str());
+      result = rc;
+    } else {
+      LockWaitCallback previous = setLockWaitCallback(windowLockReporter);
+      frame.showData(std::move(prepared.data), std::move(prepared.summary));
+      frame.show();
+      reportLoadResult(prepared.loadStatus, prepared.ignored);
+      if (!prepared.adjustmentProblems.empty()) noteList("Problems reading adjustments:", prepared.adjustmentProblems);
+      app->run();
+      setLockWaitCallback(previous);
+    }
+  }
+  sigaction(SIGTERM, &old, nullptr);
+  gTermSignal = 0;
+  OI_Application::close();
+  return result;
+}
