@@ -121,7 +121,7 @@ std::vector<KgvFileRef> buildFileList(const std::vector<std::string>& fileArgs) 
   return list;
 }
 
-ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
+ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, ViewerRun viewerRun) {
   StartupState& s = startupState();
 
   // 1. Identity for all messages.
@@ -210,7 +210,8 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck) {
   if (s.mode == RunMode::exportReport) return runExportMode(prepared);
   if (s.mode == RunMode::extract) return runExtractMode(prepared);
 
-  // The main window takes over from here once it exists.
+  // 16. The main window takes over.
+  if (viewerRun) return viewerRun(s, prepared);
   reportError(notImplemented, "%s", errorMessage(notImplemented).c_str());
   return notImplemented;
 }

@@ -72,4 +72,7 @@ using DisplayCheck = ErrorCode (*)(int& argc, char** argv);
 
 // The whole program: start-up steps, the load steps, then the mode. Returns the code the
 // process exits with (mapped by exitWithCode).
-ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck);
+// The window mode's hand-over (start-up step 16); the GUI program supplies it.
+using ViewerRun = ErrorCode (*)(StartupState& s, StartupSummary& prepared);
+
+ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, ViewerRun viewerRun = nullptr);

@@ -8,6 +8,7 @@
 #include "adjust/errors.h"
 #include "startup/diagnostic.h"
 #include "startup/startup.h"
+#include "summary/sum_frame.h"
 
 namespace {
 
@@ -18,6 +19,8 @@ ErrorCode checkDisplay(int& argc, char** argv) {
   for (int i = 1; i + 1 < argc; ++i) {
     if (argv[i] && strcmp(argv[i], "-display") == 0) {
       name = argv[i + 1];
+      // The toolkit opens its display from DISPLAY later: keep the choice there.
+      setenv("DISPLAY", name, 1);
       for (int j = i; j + 2 <= argc; ++j) argv[j] = argv[j + 2];
       argc -= 2;
       break;
@@ -42,5 +45,5 @@ ErrorCode checkDisplay(int& argc, char** argv) {
 
 int main(int argc, char** argv) {
   kgInstallSignalHandlers();
-  exitWithCode(runProgram(argc, argv, checkDisplay));
+  exitWithCode(runProgram(argc, argv, checkDisplay, runMainWindow));
 }

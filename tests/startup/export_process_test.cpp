@@ -143,10 +143,6 @@ TEST(ViewCommand, TheWindowModeBuildsTheSummaryBeforeItsHandOver) {
   r = runProcess({kestrel(), "-view", bad}, env);
   EXPECT_EQ(r.status, 28);
   EXPECT_EQ(r.err.rfind("Kestrelgauge: Couldn't summarize information:\n", 0), 0u) << r.err;
-  // Until the main window takes over, a good summary ends with "not implemented".
-  r = runProcess({kestrel(), "-view", "-sort=b_unused%", data}, env);
-  EXPECT_EQ(r.status, 5);
-  EXPECT_EQ(r.err.rfind("Kestrelgauge: ", 0), 0u) << r.err;
 }
 
 TEST(ExportCommand, TheHitsPolicyComesFromTheEnvironment) {
