@@ -26,7 +26,7 @@ class ViewerWindow : public ::testing::Test {
     ASSERT_FALSE(server.display().empty()) << "Xvfb did not start";
     std::string error;
     ASSERT_TRUE(makeKgvFile(kData, dir.file("app.kgv"), error)) << error;
-    app = std::make_unique<GuiApp>(server, std::vector<std::string>{buildDir() + "/tests/viewer_probe", dir.file("app.kgv")},
+    app = std::make_unique<GuiApp>(server, std::vector<std::string>{buildDir() + "/bin/kestrel", "-view", dir.file("app.kgv")},
                                    std::vector<std::string>{"HOME=" + dir.path(), "KESTREL_HOME=" + buildDir()});
     // The window is up with the overall row open on its three directories.
     ASSERT_TRUE(app->waitFor([](const GuiState& s) { return s.find("kgOutline") && s.find("kgOutline")->lines.size() == 4; },
@@ -228,7 +228,7 @@ TEST(ViewerNotes, OutOfDateDataAreListedInTheNoteWindowWhenTheViewerOpens) {
                           dir.file("old.kgv"), error)) << error;
   ASSERT_TRUE(makeKgvFile("record src/a.c signature=2 build=200\nfunction fa line=1 calls=2\nblock 2 hits=2\n",
                           dir.file("new.kgv"), error)) << error;
-  GuiApp app(server, {buildDir() + "/tests/viewer_probe", dir.file("old.kgv"), dir.file("new.kgv")},
+  GuiApp app(server, {buildDir() + "/bin/kestrel", "-view", dir.file("old.kgv"), dir.file("new.kgv")},
              {"HOME=" + dir.path(), "KESTREL_HOME=" + buildDir()});
   GuiState s;
   ASSERT_TRUE(app.waitViewable("kgErrorList", &s)) << app.errorOutput() << s.raw();
