@@ -11,6 +11,7 @@
 #include "adjust/adjustments_file.h"
 #include "adjust/export_report.h"
 #include "adjust/extraction.h"
+#include "adjust/source_search_path.h"
 #include "coverage/kgv_file.h"
 #include "coverage/kgv_load.h"
 #include "coverage/kgv_lock.h"
@@ -258,6 +259,10 @@ ErrorCode runMainWindow(StartupState& state, StartupSummary& prepared) {
   sigemptyset(&sa.sa_mask);
   struct sigaction old {};
   sigaction(SIGTERM, &sa, &old);
+
+  // Source files are looked for along -userpath's directories, then ".".
+  const ViewerOption* userpath = findGivenOption("userpath", state.options);
+  initSourceSearchPath(userpath ? &userpath->value : nullptr);
 
   ErrorCode result = allOK;
   {
