@@ -129,9 +129,9 @@ std::vector<std::string> kgToolbarEntries(const std::string& buttons) {
 
 KG_Toolbar::KG_Toolbar(Widget parent, std::function<void(const std::string&)> perform)
     : OI_Box(parent, "toolbar", OI_Box::horizontal) {
-  std::string spec = resourceString("buttons", "Buttons");
-  if (spec.empty()) spec = kDefaultToolbarButtons;
-  for (const std::string& name : kgToolbarEntries(spec)) {
+  std::string buttonList = resourceString("buttons", "Buttons");
+  if (buttonList.empty()) buttonList = kDefaultToolbarButtons;
+  for (const std::string& name : kgToolbarEntries(buttonList)) {
     auto b = std::make_unique<OI_Button>(widget(), name, name, [perform, name] { perform(name); });
     const std::vector<unsigned char> bits = kgToolbarIcon(name);
     b->setIcon(bits.data(), 32, 32);

@@ -14,9 +14,9 @@
 #include "toolkit/oi_xstring.h"
 
 
-bool oiParseAccelerator(const std::string& spec, std::string& accelerator, std::string& text) {
-  size_t colon = spec.find(':');
-  std::string a = spec.substr(0, colon);
+bool oiParseAccelerator(const std::string& binding, std::string& accelerator, std::string& text) {
+  size_t colon = binding.find(':');
+  std::string a = binding.substr(0, colon);
   while (!a.empty() && isspace(static_cast<unsigned char>(a.back()))) a.pop_back();
   while (!a.empty() && isspace(static_cast<unsigned char>(a.front()))) a.erase(0, 1);
   size_t key = a.find("<Key>");
@@ -56,9 +56,9 @@ OI_MenuCell::OI_MenuCell(Widget menu, const std::string& name, const std::string
 
 void OI_MenuCell::readAcceleratorResource() {
   // "accelerators" in translation syntax ("Ctrl<Key>O: fire()") sets the cell's accelerator.
-  std::string spec = resourceString("accelerators");
+  std::string binding = resourceString("accelerators");
   std::string accel, text;
-  if (!spec.empty() && oiParseAccelerator(spec, accel, text)) setAccelerator(accel, text);
+  if (!binding.empty() && oiParseAccelerator(binding, accel, text)) setAccelerator(accel, text);
 }
 
 void OI_MenuCell::setAccelerator(const std::string& accelerator, const std::string& text) {

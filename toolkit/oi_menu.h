@@ -94,4 +94,4 @@ class OI_OptionMenu : public OI_Widget {
 };
 
 // Splits "Ctrl<Key>O: fire()" into the accelerator "Ctrl<Key>O" and the text "Ctrl+O".
-bool oiParseAccelerator(const std::string& spec, std::string& accelerator, std::string& text);
+bool oiParseAccelerator(const std::string& binding, std::string& accelerator, std::string& text);
