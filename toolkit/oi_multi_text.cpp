@@ -1,6 +1,7 @@
 // The multi-line text: content, attributes, scrolling and drawing into the back buffer.
 #include "toolkit/oi_multi_text.h"
 
+#include <X11/IntrinsicP.h>
 #include <Xm/DrawingA.h>
 #include <Xm/Xm.h>
 
@@ -143,8 +144,9 @@ void OI_MultiText::preferredSize(int& width, int& height) const {
 
 uint32_t OI_MultiText::visibleLines() const {
   if (!widget()) return 0;
-  Dimension h = 0;
-  XtVaGetValues(widget(), XmNheight, &h, nullptr);
+  // Read straight from the widget record: this is asked once per changed line, and a resource
+  // lookup per call dominated rebuilding a large outline.
+  Dimension h = widget()->core.height;
   return std::max(1, h / cellHeight());
 }
 
