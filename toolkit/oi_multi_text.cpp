@@ -233,6 +233,13 @@ void OI_MultiText::replaceTail(uint32_t line, uint32_t col, const std::string& t
   contentChanged();
 }
 
+void OI_MultiText::replaceTail(uint32_t line, uint32_t col, std::u32string_view text) {
+  if (line >= lineCount()) return;
+  model_.replaceTail(line, col, text);
+  markRows(line, line);
+  contentChanged();
+}
+
 void OI_MultiText::overwrite(uint32_t line, uint32_t col, const std::string& text) {
   if (line >= lineCount()) return;
   model_.overwrite(line, col, oiDecodeUtf8(text));

@@ -65,6 +65,8 @@ class OI_MultiText : public OI_Widget {
   void deleteLines(uint32_t first, uint32_t count);
   void setLine(uint32_t line, const std::string& text);
   void replaceTail(uint32_t line, uint32_t col, const std::string& text);
+  // The same with characters already decoded, for callers that compose lines themselves.
+  void replaceTail(uint32_t line, uint32_t col, std::u32string_view text);
   void overwrite(uint32_t line, uint32_t col, const std::string& text);
   void clear();
 

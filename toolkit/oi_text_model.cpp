@@ -5,7 +5,12 @@
 
 std::u32string oiDecodeUtf8(const std::string& text) {
   std::u32string out;
-  out.reserve(text.size());
+  oiDecodeUtf8Append(text, out);
+  return out;
+}
+
+void oiDecodeUtf8Append(std::string_view text, std::u32string& out) {
+  out.reserve(out.size() + text.size());
   const auto* s = reinterpret_cast<const unsigned char*>(text.data());
   size_t n = text.size();
   for (size_t i = 0; i < n;) {
@@ -34,7 +39,6 @@ std::u32string oiDecodeUtf8(const std::string& text) {
       i += len;
     }
   }
-  return out;
 }
 
 std::string oiEncodeUtf8(const std::u32string& text) {
@@ -120,7 +124,7 @@ void OI_TextModel::setLine(uint32_t line, const std::string& text) {
   noteLength(lineLength(line));
 }
 
-void OI_TextModel::replaceTail(uint32_t line, uint32_t col, const std::u32string& text) {
+void OI_TextModel::replaceTail(uint32_t line, uint32_t col, std::u32string_view text) {
   if (line >= lines_.size()) return;
   Line& l = lines_[line];
   lengthMayShrink(static_cast<uint32_t>(l.text.size()));

@@ -4,6 +4,7 @@
 #include <compare>
 #include <cstdint>
 #include <string>
+#include <string_view>
 #include <vector>
 
 // A place in the text: a line and a character column (characters, not bytes).
@@ -32,6 +33,8 @@ struct OI_CharAttr {
 // UTF-8 in and out; a byte that is not valid UTF-8 is read as the Latin-1 character of that value,
 // so that no text is ever dropped.
 std::u32string oiDecodeUtf8(const std::string& text);
+// The same decoding, appended to a buffer the caller reuses.
+void oiDecodeUtf8Append(std::string_view text, std::u32string& out);
 std::string oiEncodeUtf8(const std::u32string& text);
 
 class OI_TextModel {
@@ -50,7 +53,7 @@ class OI_TextModel {
   // Replaces the whole line (attributes cleared); a line past the end is ignored.
   void setLine(uint32_t line, const std::string& text);
   // Keeps the first `col` characters with their attributes and puts `text` after them.
-  void replaceTail(uint32_t line, uint32_t col, const std::u32string& text);
+  void replaceTail(uint32_t line, uint32_t col, std::u32string_view text);
   // Writes `text` over the characters from `col` (the line grows when needed).
   void overwrite(uint32_t line, uint32_t col, const std::u32string& text);
   void clear();
