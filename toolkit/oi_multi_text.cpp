@@ -378,10 +378,6 @@ void OI_MultiText::pageUp() { scrollLines(-std::max(1, static_cast<int>(visibleL
 OI_Glyph* OI_MultiText::addGlyph(const std::string& name, uint32_t line, uint32_t col, const unsigned char* bits,
                                  int width, int height, const unsigned long* color) {
   if (!widget() || !bits || width <= 0 || height <= 0) return nullptr;
-  Display* d = XtDisplay(widget());
-  Pixmap p = XCreateBitmapFromData(d, RootWindowOfScreen(XtScreen(widget())), reinterpret_cast<const char*>(bits),
-                                   static_cast<unsigned>(width), static_cast<unsigned>(height));
-  if (p == None) return nullptr;
   auto g = std::make_unique<OI_Glyph>();
   g->text_ = this;
   g->name_ = name;
@@ -389,7 +385,8 @@ OI_Glyph* OI_MultiText::addGlyph(const std::string& name, uint32_t line, uint32_
   g->col_ = col;
   g->width_ = width;
   g->height_ = height;
-  g->image_ = OI_Pixmap(d, p);
+  // Rows of whole bytes, as XCreateBitmapFromData reads them.
+  g->bits_.assign(bits, bits + static_cast<size_t>((width + 7) / 8) * static_cast<size_t>(height));
   g->isBitmap_ = true;
   if (color) {
     g->color_ = *color;
@@ -647,6 +644,14 @@ void OI_MultiText::drawGlyphs(int row) {
     cellRect(line, g->col_, x, y);
     y += (cellHeight() - g->height_) / 2;
     if (g->isBitmap_) {
+      if (!g->image_) {
+        Pixmap p = XCreateBitmapFromData(d, RootWindowOfScreen(XtScreen(widget())),
+                                         reinterpret_cast<const char*>(g->bits_.data()),
+                                         static_cast<unsigned>(g->width_), static_cast<unsigned>(g->height_));
+        if (p == None) continue;
+        g->image_ = OI_Pixmap(d, p);
+        std::vector<unsigned char>().swap(g->bits_);
+      }
       XSetForeground(d, gc, g->hasColor_ ? g->color_ : fg_);
       XSetClipMask(d, gc, g->image_.get());
       XSetClipOrigin(d, gc, x, y);

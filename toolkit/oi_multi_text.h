@@ -42,6 +42,9 @@ class OI_Glyph {
   int width_ = 0;
   int height_ = 0;
   OI_Pixmap image_;   // depth 1 (drawn in the text colour) or the window's depth
+  // A bitmap glyph becomes an X pixmap only when first drawn: an outline may hold thousands of
+  // glyphs, and few of them are ever on screen.
+  std::vector<unsigned char> bits_;
   OI_Pixmap mask_;    // optional, depth 1
   bool isBitmap_ = true;
   unsigned long color_ = 0;
