@@ -284,7 +284,7 @@ void OI_MultiText::setAttributes(uint32_t line, uint32_t col, uint32_t count, ui
 }
 
 void OI_MultiText::clearAttributes(uint32_t line) {
-  if (model_.lineAttrs(line).empty()) return;
+  if (!model_.hasAttributes(line)) return;
   model_.clearAttributes(line);
   markRows(line, line);
   scheduleFlush();
@@ -582,7 +582,8 @@ void OI_MultiText::drawRow(int row) {
   XFillRectangle(d, buffer_.get(), gc, 0, y, static_cast<unsigned>(bufW_), static_cast<unsigned>(ch));
   if (line >= lineCount()) return;
   const std::u32string& text = model_.lineChars(line);
-  const std::vector<OI_CharAttr>& attrs = model_.lineAttrs(line);
+  std::vector<OI_CharAttr>& attrs = rowAttrs_;
+  model_.lineAttrs(line, attrs);
   OI_TextPos ss = model_.selectionStart(), se = model_.selectionEnd();
   bool anySel = model_.hasSelection() && ss.line <= line && line <= se.line;
   // A selection that runs past the end of this line is shown to the window's edge.

@@ -218,6 +218,7 @@ class OI_MultiText : public OI_Widget {
   uint32_t left_ = 0;
   int hold_ = 0;
   std::vector<char> dirty_;  // per visible row: needs drawing into the buffer
+  std::vector<OI_CharAttr> rowAttrs_;  // drawRow's working copy of a line's attributes
   bool allDirty_ = true;
   int copyFrom_ = -1, copyTo_ = -1;  // rows to copy from the buffer to the window
   OI_TimerHandle flushJob_;

@@ -62,7 +62,9 @@ class OI_TextModel {
   // Sets the attributes of `count` characters from `col`, limited to the line's length.
   void setAttributes(uint32_t line, uint32_t col, uint32_t count, OI_CharAttr attr);
   void clearAttributes(uint32_t line);
-  const std::vector<OI_CharAttr>& lineAttrs(uint32_t line) const;  // empty when all are plain
+  bool hasAttributes(uint32_t line) const;  // false when all characters are plain
+  // One attribute per character of the line, or nothing when all are plain.
+  void lineAttrs(uint32_t line, std::vector<OI_CharAttr>& out) const;
 
   // Selection from `start` up to, not including, `end`; empty when they are equal.
   void setSelection(OI_TextPos start, OI_TextPos end);
@@ -78,10 +80,18 @@ class OI_TextModel {
   void wordAround(OI_TextPos pos, OI_TextPos& start, OI_TextPos& end) const;
 
  private:
+  // A stretch of characters that are not plain. A line keeps only these, in column order and not
+  // overlapping: a large outline has tens of thousands of lines with a few marks each.
+  struct AttrRun {
+    uint32_t col = 0;
+    uint32_t count = 0;
+    OI_CharAttr attr;
+  };
   struct Line {
     std::u32string text;
-    std::vector<OI_CharAttr> attrs;  // empty, or one per character
+    std::vector<AttrRun> attrs;
   };
+  static void cutAttrs(Line& l, uint32_t from, uint32_t to);  // plain again over [from, to)
   void noteLength(uint32_t len);
   void lengthMayShrink(uint32_t len);
   void adjustSelectionForInsert(uint32_t before, uint32_t count);
