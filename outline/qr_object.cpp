@@ -19,7 +19,7 @@ QR_Object::~QR_Object() {
 void QR_Object::linked_object_destroyed(QR_Object*) {}
 
 void QR_Object::link(QR_Object* other) {
-  if (other == nullptr || other == this) return;
+  if (other == nullptr || other == this || is_linked(other)) return;
   add_link(other);
   other->add_link(this);
 }
@@ -30,11 +30,18 @@ void QR_Object::unlink(QR_Object* other) {
   other->drop_link(this);
 }
 
-bool QR_Object::is_linked(const QR_Object* other) const { return links_ && links_->contains(other); }
+// Links are mutual, so the shorter of the two lists answers: a display linked to thousands of
+// rows is asked about each row, and each row holds only a few links.
+bool QR_Object::is_linked(const QR_Object* other) const {
+  if (!links_ || other == nullptr || !other->links_) return false;
+  if (other->links_->count() < links_->count()) return other->links_->contains(this);
+  return links_->contains(other);
+}
 
 void QR_Object::add_link(QR_Object* other) {
+  // The caller has checked that the two are not linked yet.
   if (!links_) links_ = std::make_unique<QR_PointerArray<QR_Object>>();
-  if (!links_->contains(other)) links_->append(other);
+  links_->append(other);
 }
 
 void QR_Object::drop_link(QR_Object* other) {

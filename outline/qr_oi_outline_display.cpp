@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <sstream>
 
 #include "outline/qr_oi_multi_text.h"
@@ -222,18 +223,23 @@ void QR_OI_OutlineDisplay::delete_lines(uint32_t first, uint32_t count) {
 
 void QR_OI_OutlineDisplay::set_line(uint32_t depth, uint32_t line, const char* text, QR_OutlineObject* row) {
   // 1. Indentation, then the text with tabs expanded from the text's own first character.
-  std::u32string composed(text_column(depth), U' ');
-  std::u32string body = oiDecodeUtf8(text ? text : "");
-  std::u32string expanded;
-  for (char32_t c : body) {
-    if (c == U'\t') {
-      do expanded.push_back(U' ');
-      while (expanded.size() % tabWidth_ != 0);
-    } else {
-      expanded.push_back(c);
+  // The line is composed in a buffer kept between calls: Expand all sets tens of thousands of lines.
+  std::u32string& composed = composed_;
+  composed.assign(text_column(depth), U' ');
+  const size_t start = composed.size();
+  oiDecodeUtf8Append(text ? std::string_view(text) : std::string_view(), composed);
+  if (composed.find(U'\t', start) != std::u32string::npos) {
+    std::u32string body = composed.substr(start);
+    composed.resize(start);
+    for (char32_t c : body) {
+      if (c == U'\t') {
+        do composed.push_back(U' ');
+        while ((composed.size() - start) % tabWidth_ != 0);
+      } else {
+        composed.push_back(c);
+      }
     }
   }
-  composed += expanded;
   // 2. Only what differs from the line on screen is rewritten.
   if (line >= text_->lineCount()) {
     text_->insertLine(line, oiEncodeUtf8(composed));
@@ -242,7 +248,7 @@ void QR_OI_OutlineDisplay::set_line(uint32_t depth, uint32_t line, const char* t
     size_t common = 0;
     while (common < old.size() && common < composed.size() && old[common] == composed[common]) ++common;
     if (common != old.size() || common != composed.size())
-      text_->replaceTail(line, static_cast<uint32_t>(common), oiEncodeUtf8(composed.substr(common)));
+      text_->replaceTail(line, static_cast<uint32_t>(common), std::u32string_view(composed).substr(common));
   }
   // 3. Attributes: plain, with the separator at every column mark.
   text_->clearAttributes(line);
@@ -251,7 +257,8 @@ void QR_OI_OutlineDisplay::set_line(uint32_t depth, uint32_t line, const char* t
   // 4. The current row's marker.
   if (row && row->first_line() != QR_OutlineObject::kNoLine && line >= row->first_line()) {
     QR_OutlineAnnotation* here = row->annotation_at(line - row->first_line(), 0);
-    if (here && std::string(here->name_text()) == "QR_OutlineHere") {
+    const char* name = here ? here->name_text() : nullptr;
+    if (name && std::strcmp(name, "QR_OutlineHere") == 0) {
       uint32_t col = depth > 0 ? text_column(depth - 1) : 0;
       text_->overwrite(line, col, "=>");
       text_->setAttributes(line, col, 2, OI_attrForeground, text_->highlightColor());

@@ -121,6 +121,7 @@ class QR_OI_OutlineDisplay : public QR_OutlineDisplay {
   OI_ScrollText* scroll_ = nullptr;
   uint32_t tabWidth_ = 8;
   std::vector<uint32_t> marks_;
+  std::u32string composed_;  // set_line's working buffer
   std::vector<QR_OI_Enhancement> enhancements_;
   std::map<XrmQuark, std::unique_ptr<QR_OI_Annotation>> images_;
   // Keyed by the row as a QR_Object, so that a row's end (heard as a QR_Object) finds its glyphs.

@@ -1,18 +1,36 @@
 // Cell formatting for the summary outline and its headings.
 #include "summary/cell_format.h"
 
+#include <charconv>
 #include <cstdio>
 #include <cstring>
 #include <ctime>
+#include <string_view>
 
 namespace {
 
 constexpr unsigned kLimit = 1024;
 
-std::string limited(const char* text) {
-  std::string t = text ? text : "";
-  if (t.size() > kLimit) t.resize(kLimit);
-  return t;
+// The text as far as the limit, without copying it.
+std::string_view limited(const char* text) {
+  if (text == nullptr) return {};
+  return std::string_view(text, strnlen(text, kLimit));
+}
+
+// Cells are formatted by the ten thousand when a large outline opens: build each result in place.
+std::string padded(std::string_view before, std::string_view text, std::string_view after) {
+  std::string out;
+  out.reserve(before.size() + text.size() + after.size());
+  out.append(before).append(text).append(after);
+  return out;
+}
+
+std::string fills(std::size_t n, char fill) { return std::string(n, fill); }
+
+// An unsigned value's decimal digits in buf, as printf's "%u" gives them.
+std::string_view decimal(char (&buf)[32], std::uint32_t value) {
+  auto r = std::to_chars(buf, buf + sizeof buf, value);
+  return std::string_view(buf, static_cast<std::size_t>(r.ptr - buf));
 }
 
 bool gNowKnown = false;
@@ -20,32 +38,38 @@ std::uint32_t gNow = 0;
 
 }  // namespace
 
-std::string justify_right(const char* text, unsigned width, char fill) {
-  std::string t = limited(text);
+namespace {
+
+std::string right(std::string_view t, unsigned width, char fill) {
   if (width > kLimit) width = kLimit;
-  if (t.size() >= width) return t;
-  return std::string(width - t.size(), fill) + t;
+  if (t.size() >= width) return std::string(t);
+  std::string out(width, fill);
+  out.replace(width - t.size(), t.size(), t);
+  return out;
 }
 
+}  // namespace
+
+std::string justify_right(const char* text, unsigned width, char fill) { return right(limited(text), width, fill); }
+
 std::string justify_left(const char* text, unsigned width, char fill) {
-  std::string t = limited(text);
+  std::string_view t = limited(text);
   if (width > kLimit) width = kLimit;
-  if (t.size() >= width) return t;
-  return t + std::string(width - t.size(), fill);
+  if (t.size() >= width) return std::string(t);
+  return padded({}, t, fills(width - t.size(), fill));
 }
 
 std::string justify_centre(const char* text, unsigned width, char fill) {
-  std::string t = limited(text);
+  std::string_view t = limited(text);
   if (width > kLimit) width = kLimit;
-  if (t.size() >= width) return t;
+  if (t.size() >= width) return std::string(t);
   size_t before = (width - t.size()) / 2;
-  return std::string(before, fill) + t + std::string(width - t.size() - before, fill);
+  return padded(fills(before, fill), t, fills(width - t.size() - before, fill));
 }
 
 std::string format_count(unsigned width, std::uint32_t value) {
   char buf[32];
-  snprintf(buf, sizeof buf, "%u", value);
-  return justify_right(buf, width);
+  return right(decimal(buf, value), width, ' ');
 }
 
 std::string format_small_count(unsigned width, std::uint32_t value) {
@@ -59,8 +83,9 @@ std::string format_percent(unsigned width, std::uint32_t part, std::uint32_t who
   if (part == whole) return justify_right("100%", width);
   char buf[32];
   double pct = static_cast<double>(part) * 100.0 / static_cast<double>(whole);
-  snprintf(buf, sizeof buf, "%d%%", static_cast<int>(pct));
-  return justify_right(buf, width);
+  auto r = std::to_chars(buf, buf + sizeof buf - 1, static_cast<int>(pct));
+  *r.ptr++ = '%';
+  return right(std::string_view(buf, static_cast<std::size_t>(r.ptr - buf)), width, ' ');
 }
 
 std::string format_elapsed(unsigned width, std::uint32_t tenths) {

@@ -2,6 +2,7 @@
 #include "summary/kg_outline_text.h"
 
 #include <algorithm>
+#include <string_view>
 
 #include "adjust/adjustment_list.h"
 #include "coverage/summary_build.h"
@@ -38,18 +39,19 @@ NameStyle kgNameStyleFromSettings() {
 namespace {
 
 // Puts text into the buffer at position, cut or padded to exactly width characters.
-void place(std::string& buffer, std::size_t position, std::uint32_t width, const std::string& text) {
+void place(std::string& buffer, std::size_t position, std::uint32_t width, std::string_view text) {
   if (buffer.size() < position + width) buffer.resize(position + width, ' ');
   std::size_t n = std::min<std::size_t>(text.size(), width);
-  buffer.replace(position, n, text, 0, n);
+  buffer.replace(position, n, text.data(), n);
   std::fill(buffer.begin() + static_cast<std::ptrdiff_t>(position + n),
             buffer.begin() + static_cast<std::ptrdiff_t>(position + width), ' ');
 }
 
 // A right-justified text cut from the left so that its end stays in view.
-std::string fitRight(const std::string& s, std::uint32_t width) {
-  if (s.size() <= width) return s;
-  return s.substr(s.size() - width);
+std::string_view fitRight(const std::string& s, std::uint32_t width) {
+  std::string_view v(s);
+  if (v.size() <= width) return v;
+  return v.substr(v.size() - width);
 }
 
 void adjustFuncCounts(std::uint32_t& deadFuncs, int deadDelta) {

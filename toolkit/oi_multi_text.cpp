@@ -1,6 +1,7 @@
 // The multi-line text: content, attributes, scrolling and drawing into the back buffer.
 #include "toolkit/oi_multi_text.h"
 
+#include <X11/IntrinsicP.h>
 #include <Xm/DrawingA.h>
 #include <Xm/Xm.h>
 
@@ -143,8 +144,9 @@ void OI_MultiText::preferredSize(int& width, int& height) const {
 
 uint32_t OI_MultiText::visibleLines() const {
   if (!widget()) return 0;
-  Dimension h = 0;
-  XtVaGetValues(widget(), XmNheight, &h, nullptr);
+  // Read straight from the widget record: this is asked once per changed line, and a resource
+  // lookup per call dominated rebuilding a large outline.
+  Dimension h = widget()->core.height;
   return std::max(1, h / cellHeight());
 }
 
@@ -231,6 +233,13 @@ void OI_MultiText::replaceTail(uint32_t line, uint32_t col, const std::string& t
   contentChanged();
 }
 
+void OI_MultiText::replaceTail(uint32_t line, uint32_t col, std::u32string_view text) {
+  if (line >= lineCount()) return;
+  model_.replaceTail(line, col, text);
+  markRows(line, line);
+  contentChanged();
+}
+
 void OI_MultiText::overwrite(uint32_t line, uint32_t col, const std::string& text) {
   if (line >= lineCount()) return;
   model_.overwrite(line, col, oiDecodeUtf8(text));
@@ -275,7 +284,7 @@ void OI_MultiText::setAttributes(uint32_t line, uint32_t col, uint32_t count, ui
 }
 
 void OI_MultiText::clearAttributes(uint32_t line) {
-  if (model_.lineAttrs(line).empty()) return;
+  if (!model_.hasAttributes(line)) return;
   model_.clearAttributes(line);
   markRows(line, line);
   scheduleFlush();
@@ -369,10 +378,6 @@ void OI_MultiText::pageUp() { scrollLines(-std::max(1, static_cast<int>(visibleL
 OI_Glyph* OI_MultiText::addGlyph(const std::string& name, uint32_t line, uint32_t col, const unsigned char* bits,
                                  int width, int height, const unsigned long* color) {
   if (!widget() || !bits || width <= 0 || height <= 0) return nullptr;
-  Display* d = XtDisplay(widget());
-  Pixmap p = XCreateBitmapFromData(d, RootWindowOfScreen(XtScreen(widget())), reinterpret_cast<const char*>(bits),
-                                   static_cast<unsigned>(width), static_cast<unsigned>(height));
-  if (p == None) return nullptr;
   auto g = std::make_unique<OI_Glyph>();
   g->text_ = this;
   g->name_ = name;
@@ -380,7 +385,8 @@ OI_Glyph* OI_MultiText::addGlyph(const std::string& name, uint32_t line, uint32_
   g->col_ = col;
   g->width_ = width;
   g->height_ = height;
-  g->image_ = OI_Pixmap(d, p);
+  // Rows of whole bytes, as XCreateBitmapFromData reads them.
+  g->bits_.assign(bits, bits + static_cast<size_t>((width + 7) / 8) * static_cast<size_t>(height));
   g->isBitmap_ = true;
   if (color) {
     g->color_ = *color;
@@ -576,7 +582,8 @@ void OI_MultiText::drawRow(int row) {
   XFillRectangle(d, buffer_.get(), gc, 0, y, static_cast<unsigned>(bufW_), static_cast<unsigned>(ch));
   if (line >= lineCount()) return;
   const std::u32string& text = model_.lineChars(line);
-  const std::vector<OI_CharAttr>& attrs = model_.lineAttrs(line);
+  std::vector<OI_CharAttr>& attrs = rowAttrs_;
+  model_.lineAttrs(line, attrs);
   OI_TextPos ss = model_.selectionStart(), se = model_.selectionEnd();
   bool anySel = model_.hasSelection() && ss.line <= line && line <= se.line;
   // A selection that runs past the end of this line is shown to the window's edge.
@@ -638,6 +645,14 @@ void OI_MultiText::drawGlyphs(int row) {
     cellRect(line, g->col_, x, y);
     y += (cellHeight() - g->height_) / 2;
     if (g->isBitmap_) {
+      if (!g->image_) {
+        Pixmap p = XCreateBitmapFromData(d, RootWindowOfScreen(XtScreen(widget())),
+                                         reinterpret_cast<const char*>(g->bits_.data()),
+                                         static_cast<unsigned>(g->width_), static_cast<unsigned>(g->height_));
+        if (p == None) continue;
+        g->image_ = OI_Pixmap(d, p);
+        std::vector<unsigned char>().swap(g->bits_);
+      }
       XSetForeground(d, gc, g->hasColor_ ? g->color_ : fg_);
       XSetClipMask(d, gc, g->image_.get());
       XSetClipOrigin(d, gc, x, y);

@@ -42,6 +42,9 @@ class OI_Glyph {
   int width_ = 0;
   int height_ = 0;
   OI_Pixmap image_;   // depth 1 (drawn in the text colour) or the window's depth
+  // A bitmap glyph becomes an X pixmap only when first drawn: an outline may hold thousands of
+  // glyphs, and few of them are ever on screen.
+  std::vector<unsigned char> bits_;
   OI_Pixmap mask_;    // optional, depth 1
   bool isBitmap_ = true;
   unsigned long color_ = 0;
@@ -65,6 +68,8 @@ class OI_MultiText : public OI_Widget {
   void deleteLines(uint32_t first, uint32_t count);
   void setLine(uint32_t line, const std::string& text);
   void replaceTail(uint32_t line, uint32_t col, const std::string& text);
+  // The same with characters already decoded, for callers that compose lines themselves.
+  void replaceTail(uint32_t line, uint32_t col, std::u32string_view text);
   void overwrite(uint32_t line, uint32_t col, const std::string& text);
   void clear();
 
@@ -213,6 +218,7 @@ class OI_MultiText : public OI_Widget {
   uint32_t left_ = 0;
   int hold_ = 0;
   std::vector<char> dirty_;  // per visible row: needs drawing into the buffer
+  std::vector<OI_CharAttr> rowAttrs_;  // drawRow's working copy of a line's attributes
   bool allDirty_ = true;
   int copyFrom_ = -1, copyTo_ = -1;  // rows to copy from the buffer to the window
   OI_TimerHandle flushJob_;

@@ -5,7 +5,12 @@
 
 std::u32string oiDecodeUtf8(const std::string& text) {
   std::u32string out;
-  out.reserve(text.size());
+  oiDecodeUtf8Append(text, out);
+  return out;
+}
+
+void oiDecodeUtf8Append(std::string_view text, std::u32string& out) {
+  out.reserve(out.size() + text.size());
   const auto* s = reinterpret_cast<const unsigned char*>(text.data());
   size_t n = text.size();
   for (size_t i = 0; i < n;) {
@@ -34,7 +39,6 @@ std::u32string oiDecodeUtf8(const std::string& text) {
       i += len;
     }
   }
-  return out;
 }
 
 std::string oiEncodeUtf8(const std::u32string& text) {
@@ -120,14 +124,14 @@ void OI_TextModel::setLine(uint32_t line, const std::string& text) {
   noteLength(lineLength(line));
 }
 
-void OI_TextModel::replaceTail(uint32_t line, uint32_t col, const std::u32string& text) {
+void OI_TextModel::replaceTail(uint32_t line, uint32_t col, std::u32string_view text) {
   if (line >= lines_.size()) return;
   Line& l = lines_[line];
   lengthMayShrink(static_cast<uint32_t>(l.text.size()));
   col = std::min<uint32_t>(col, static_cast<uint32_t>(l.text.size()));
   l.text.resize(col);
   l.text += text;
-  if (!l.attrs.empty()) l.attrs.resize(l.text.size());
+  cutAttrs(l, col, UINT32_MAX);  // the new tail starts plain
   noteLength(static_cast<uint32_t>(l.text.size()));
 }
 
@@ -136,7 +140,6 @@ void OI_TextModel::overwrite(uint32_t line, uint32_t col, const std::u32string& 
   Line& l = lines_[line];
   if (l.text.size() < col + text.size()) l.text.resize(col + text.size(), U' ');
   l.text.replace(col, text.size(), text);
-  if (!l.attrs.empty()) l.attrs.resize(l.text.size());
   noteLength(static_cast<uint32_t>(l.text.size()));
 }
 
@@ -148,29 +151,67 @@ void OI_TextModel::clear() {
 }
 
 OI_CharAttr OI_TextModel::attrAt(uint32_t line, uint32_t col) const {
-  if (line >= lines_.size() || col >= lines_[line].attrs.size()) return {};
-  return lines_[line].attrs[col];
+  if (line >= lines_.size()) return {};
+  for (const AttrRun& r : lines_[line].attrs) {
+    if (col < r.col) break;
+    if (col - r.col < r.count) return r.attr;
+  }
+  return {};
+}
+
+void OI_TextModel::cutAttrs(Line& l, uint32_t from, uint32_t to) {
+  std::vector<AttrRun>& runs = l.attrs;
+  for (size_t i = 0; i < runs.size();) {
+    AttrRun& r = runs[i];
+    const uint64_t end = uint64_t(r.col) + r.count;
+    if (end <= from || r.col >= to) {
+      ++i;
+    } else if (r.col < from && end > to) {
+      // The cut lies inside the run: it splits in two.
+      AttrRun tail{to, static_cast<uint32_t>(end - to), r.attr};
+      r.count = from - r.col;
+      runs.insert(runs.begin() + static_cast<std::ptrdiff_t>(i) + 1, tail);
+      return;
+    } else if (r.col < from) {
+      r.count = from - r.col;
+      ++i;
+    } else if (end > to) {
+      r.count = static_cast<uint32_t>(end - to);
+      r.col = to;
+      ++i;
+    } else {
+      runs.erase(runs.begin() + static_cast<std::ptrdiff_t>(i));
+    }
+  }
+  if (runs.empty()) std::vector<AttrRun>().swap(runs);
 }
 
 void OI_TextModel::setAttributes(uint32_t line, uint32_t col, uint32_t count, OI_CharAttr attr) {
   if (line >= lines_.size()) return;
   Line& l = lines_[line];
-  if (col >= l.text.size()) return;
+  if (col >= l.text.size() || count == 0) return;
   count = std::min<uint32_t>(count, static_cast<uint32_t>(l.text.size()) - col);
-  if (l.attrs.empty()) {
-    if (attr == OI_CharAttr{}) return;
-    l.attrs.resize(l.text.size());
-  }
-  std::fill(l.attrs.begin() + col, l.attrs.begin() + col + count, attr);
+  cutAttrs(l, col, col + count);
+  if (attr == OI_CharAttr{}) return;
+  auto at = std::find_if(l.attrs.begin(), l.attrs.end(), [col](const AttrRun& r) { return r.col > col; });
+  l.attrs.insert(at, AttrRun{col, count, attr});
 }
 
 void OI_TextModel::clearAttributes(uint32_t line) {
   if (line < lines_.size()) lines_[line].attrs.clear();
 }
 
-const std::vector<OI_CharAttr>& OI_TextModel::lineAttrs(uint32_t line) const {
-  static const std::vector<OI_CharAttr> none;
-  return line < lines_.size() ? lines_[line].attrs : none;
+bool OI_TextModel::hasAttributes(uint32_t line) const { return line < lines_.size() && !lines_[line].attrs.empty(); }
+
+void OI_TextModel::lineAttrs(uint32_t line, std::vector<OI_CharAttr>& out) const {
+  out.clear();
+  if (line >= lines_.size() || lines_[line].attrs.empty()) return;
+  const Line& l = lines_[line];
+  out.resize(l.text.size());
+  for (const AttrRun& r : l.attrs) {
+    const uint32_t end = std::min<uint32_t>(r.col + r.count, static_cast<uint32_t>(out.size()));
+    for (uint32_t c = r.col; c < end; ++c) out[c] = r.attr;
+  }
 }
 
 void OI_TextModel::setSelection(OI_TextPos start, OI_TextPos end) {

@@ -4,6 +4,7 @@
 #include <compare>
 #include <cstdint>
 #include <string>
+#include <string_view>
 #include <vector>
 
 // A place in the text: a line and a character column (characters, not bytes).
@@ -32,6 +33,8 @@ struct OI_CharAttr {
 // UTF-8 in and out; a byte that is not valid UTF-8 is read as the Latin-1 character of that value,
 // so that no text is ever dropped.
 std::u32string oiDecodeUtf8(const std::string& text);
+// The same decoding, appended to a buffer the caller reuses.
+void oiDecodeUtf8Append(std::string_view text, std::u32string& out);
 std::string oiEncodeUtf8(const std::u32string& text);
 
 class OI_TextModel {
@@ -50,7 +53,7 @@ class OI_TextModel {
   // Replaces the whole line (attributes cleared); a line past the end is ignored.
   void setLine(uint32_t line, const std::string& text);
   // Keeps the first `col` characters with their attributes and puts `text` after them.
-  void replaceTail(uint32_t line, uint32_t col, const std::u32string& text);
+  void replaceTail(uint32_t line, uint32_t col, std::u32string_view text);
   // Writes `text` over the characters from `col` (the line grows when needed).
   void overwrite(uint32_t line, uint32_t col, const std::u32string& text);
   void clear();
@@ -59,7 +62,9 @@ class OI_TextModel {
   // Sets the attributes of `count` characters from `col`, limited to the line's length.
   void setAttributes(uint32_t line, uint32_t col, uint32_t count, OI_CharAttr attr);
   void clearAttributes(uint32_t line);
-  const std::vector<OI_CharAttr>& lineAttrs(uint32_t line) const;  // empty when all are plain
+  bool hasAttributes(uint32_t line) const;  // false when all characters are plain
+  // One attribute per character of the line, or nothing when all are plain.
+  void lineAttrs(uint32_t line, std::vector<OI_CharAttr>& out) const;
 
   // Selection from `start` up to, not including, `end`; empty when they are equal.
   void setSelection(OI_TextPos start, OI_TextPos end);
@@ -75,10 +80,18 @@ class OI_TextModel {
   void wordAround(OI_TextPos pos, OI_TextPos& start, OI_TextPos& end) const;
 
  private:
+  // A stretch of characters that are not plain. A line keeps only these, in column order and not
+  // overlapping: a large outline has tens of thousands of lines with a few marks each.
+  struct AttrRun {
+    uint32_t col = 0;
+    uint32_t count = 0;
+    OI_CharAttr attr;
+  };
   struct Line {
     std::u32string text;
-    std::vector<OI_CharAttr> attrs;  // empty, or one per character
+    std::vector<AttrRun> attrs;
   };
+  static void cutAttrs(Line& l, uint32_t from, uint32_t to);  // plain again over [from, to)
   void noteLength(uint32_t len);
   void lengthMayShrink(uint32_t len);
   void adjustSelectionForInsert(uint32_t before, uint32_t count);

@@ -40,6 +40,42 @@ TEST(TextModel, RowsChangeOnlyAfterTheirCommonBeginning) {
   EXPECT_EQ(m.lineCount(), 2u);
 }
 
+TEST(TextModel, HighlightsLaidOverEachOtherShowWhatWasSetLast) {
+  // A row with column separators, a coloured name laid across two of them, then part of it cleared.
+  OI_TextModel m;
+  m.insertLines(0, {"name      12  50%  7"});
+  const OI_CharAttr sep{OI_attrSeparator, 0, 0}, red{OI_attrForeground, 3, 0};
+  for (uint32_t c : {4u, 9u, 13u, 18u}) m.setAttributes(0, c, 1, sep);
+  m.setAttributes(0, 2, 10, red);  // covers the separators at 4 and 9
+  EXPECT_EQ(m.attrAt(0, 1), OI_CharAttr{});
+  EXPECT_EQ(m.attrAt(0, 4), red);
+  EXPECT_EQ(m.attrAt(0, 11), red);
+  EXPECT_EQ(m.attrAt(0, 12), OI_CharAttr{});
+  EXPECT_EQ(m.attrAt(0, 13), sep);
+  m.setAttributes(0, 5, 2, OI_CharAttr{});  // a plain hole in the middle of the red stretch
+  EXPECT_EQ(m.attrAt(0, 4), red);
+  EXPECT_EQ(m.attrAt(0, 5), OI_CharAttr{});
+  EXPECT_EQ(m.attrAt(0, 6), OI_CharAttr{});
+  EXPECT_EQ(m.attrAt(0, 7), red);
+  std::vector<OI_CharAttr> each;
+  m.lineAttrs(0, each);
+  ASSERT_EQ(each.size(), m.lineLength(0));
+  EXPECT_EQ(each[3], red);
+  EXPECT_EQ(each[6], OI_CharAttr{});
+  EXPECT_EQ(each[18], sep);
+  // A new tail is plain; the beginning keeps its highlights.
+  m.replaceTail(0, 10, U"1");
+  EXPECT_EQ(m.attrAt(0, 9), red);
+  EXPECT_EQ(m.attrAt(0, 10), OI_CharAttr{});
+  m.replaceTail(0, 11, U"2  50%  7");
+  EXPECT_EQ(m.attrAt(0, 13), OI_CharAttr{});
+  EXPECT_TRUE(m.hasAttributes(0));
+  m.setAttributes(0, 0, 99, OI_CharAttr{});
+  EXPECT_FALSE(m.hasAttributes(0));
+  m.lineAttrs(0, each);
+  EXPECT_TRUE(each.empty());
+}
+
 TEST(TextModel, LongestLineFollowsInsertionsAndDeletions) {
   OI_TextModel m;
   m.insertLines(0, {"short", "a much longer line", "mid length"});
