@@ -83,7 +83,8 @@ std::string format_percent(unsigned width, std::uint32_t part, std::uint32_t who
   if (part == whole) return justify_right("100%", width);
   char buf[32];
   double pct = static_cast<double>(part) * 100.0 / static_cast<double>(whole);
-  auto r = std::to_chars(buf, buf + sizeof buf - 1, static_cast<int>(pct));
+  // A part far above its whole (damaged data) still fits: no narrowing to int.
+  auto r = std::to_chars(buf, buf + sizeof buf - 1, static_cast<long long>(pct));
   *r.ptr++ = '%';
   return right(std::string_view(buf, static_cast<std::size_t>(r.ptr - buf)), width, ' ');
 }

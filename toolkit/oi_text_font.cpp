@@ -33,14 +33,14 @@ void OI_TextFont::drawCells(XftDraw* draw, const XftColor& color, Drawable d, GC
   if (n == 0) return;
   if (xft_ && draw) {
     // Each character is placed on its own cell so that the grid holds whatever the glyph widths.
-    std::vector<XftCharSpec> spec;
-    spec.reserve(n);
+    std::vector<XftCharSpec> glyphs;
+    glyphs.reserve(n);
     for (size_t i = 0; i < n; ++i) {
       if (s[i] == U' ') continue;
-      spec.push_back(XftCharSpec{static_cast<FcChar32>(s[i]), static_cast<short>(x + int(i) * cellWidth_),
+      glyphs.push_back(XftCharSpec{static_cast<FcChar32>(s[i]), static_cast<short>(x + int(i) * cellWidth_),
                                  static_cast<short>(y)});
     }
-    if (!spec.empty()) XftDrawCharSpec(draw, &color, xft_, spec.data(), static_cast<int>(spec.size()));
+    if (!glyphs.empty()) XftDrawCharSpec(draw, &color, xft_, glyphs.data(), static_cast<int>(glyphs.size()));
     return;
   }
   if (core_) {

@@ -31,6 +31,7 @@ TEST(CellFormat, PercentShowsHundredOnlyWhenComplete) {
   EXPECT_EQ(format_percent(4, 1, 1000), "  0%");
   EXPECT_EQ(format_percent(4, 4294967295u, 4294967295u), "100%");
   EXPECT_EQ(format_percent(4, 4294967294u, 4294967295u), " 99%");
+  EXPECT_EQ(format_percent(4, 4294967295u, 1), "429496729500%");  // damaged data: no overflow
 }
 
 TEST(CellFormat, ElapsedTimes) {
