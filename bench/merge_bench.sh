@@ -34,26 +34,7 @@ rm -f "$WORK/probe.kgv"
 
 cat "${inputs[@]}" >/dev/null  # both runs read from the page cache
 
-# seconds and peak kilobytes of one command, from /usr/bin/time -v
-measure() {
-  "$TIME" -v -o "$WORK/time.txt" "$@" >/dev/null
-  local wall rss cpu
-  wall=$(sed -n 's/.*Elapsed (wall clock) time (h:mm:ss or m:ss): //p' "$WORK/time.txt" |
-    awk -F: '{ s = 0; for (i = 1; i <= NF; i++) s = s * 60 + $i; print s }')
-  rss=$(sed -n 's/.*Maximum resident set size (kbytes): //p' "$WORK/time.txt")
-  cpu=$(sed -n 's/.*\(User\|System\) time (seconds): //p' "$WORK/time.txt" | awk '{ s += $1 } END { print s }')
-  echo "$wall $rss $cpu"
-}
-
-# The best of three runs of each, as the machine is shared.
-best() {
-  local s kb cpu bs="" bkb="" bcpu=""
-  for _ in 1 2 3; do
-    read -r s kb cpu < <(measure "$@")
-    if [ -z "$bs" ] || awk -v a="$s" -v b="$bs" 'BEGIN { exit !(a < b) }'; then bs=$s bkb=$kb bcpu=$cpu; fi
-  done
-  echo "$bs $bkb $bcpu"
-}
+. "$(dirname "$0")/timing.inc"
 read -r cat_s cat_kb cat_cpu < <(best sh -c 'cat "$@" >/dev/null' sh "${inputs[@]}")
 read -r merge_s merge_kb merge_cpu < <(best "${merge[@]}" "-merge=$WORK/merged.kgv" "${inputs[@]}")
 out_bytes=$(wc -c <"$WORK/merged.kgv")

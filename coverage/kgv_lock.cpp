@@ -73,14 +73,25 @@ ErrorCode kgvLockName(const std::string& path, std::string& lockName) {
   return allOK;
 }
 
+namespace {
+
+// The lock name of a path, remembered with the path for the wait callback.
+ErrorCode beginLockCall(const std::string& path, std::string& name) {
+  ErrorCode rc = kgvLockName(path, name);
+  if (rc != allOK) return rc;
+  settings().lastPath = path;
+  settings().lastLockName = name;
+  return allOK;
+}
+
+}  // namespace
+
 ErrorCode lockKgvFile(const std::string& path) {
   LockSettings& s = settings();
   if (!s.enabled) return allOK;
   std::string name;
-  ErrorCode rc = kgvLockName(path, name);
+  ErrorCode rc = beginLockCall(path, name);
   if (rc != allOK) return rc;
-  s.lastPath = path;
-  s.lastLockName = name;
 
   unsigned tries = 0, races = 0;
   while (tries < s.maxTries && races < s.maxRaces) {
@@ -133,10 +144,8 @@ ErrorCode unlockKgvFile(const std::string& path) {
   LockSettings& s = settings();
   if (!s.enabled) return allOK;
   std::string name;
-  ErrorCode rc = kgvLockName(path, name);
+  ErrorCode rc = beginLockCall(path, name);
   if (rc != allOK) return rc;
-  s.lastPath = path;
-  s.lastLockName = name;
   struct stat st;
   if (lstat(name.c_str(), &st) == 0) {
     if (LockSettings::Held* h = heldLock(st)) {

@@ -227,10 +227,7 @@ void OI_MultiText::setLine(uint32_t line, const std::string& text) {
 }
 
 void OI_MultiText::replaceTail(uint32_t line, uint32_t col, const std::string& text) {
-  if (line >= lineCount()) return;
-  model_.replaceTail(line, col, oiDecodeUtf8(text));
-  markRows(line, line);
-  contentChanged();
+  replaceTail(line, col, std::u32string_view(oiDecodeUtf8(text)));
 }
 
 void OI_MultiText::replaceTail(uint32_t line, uint32_t col, std::u32string_view text) {
