@@ -14,8 +14,8 @@
 #include "adjust/adjustments_lock.h"
 #include "adjust/code_set.h"
 #include "adjust/src_file.h"
-#include "adjust/string_format.h"
-#include "startup/atomic_write.h"
+#include "support/atomic_write.h"
+#include "support/string_helpers.h"
 
 const char* const kDefaultAdjustmentsFile = "~/.kestrel.adjust";
 const char* const kAdjustmentsWriterName = "Kestrelgauge viewer";

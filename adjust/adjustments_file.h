@@ -8,7 +8,7 @@
 #include <vector>
 
 #include "adjust/adjustment_list.h"
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 extern const char* const kDefaultAdjustmentsFile;  // "~/.kestrel.adjust"
 extern const char* const kAdjustmentsWriterName;   // "Kestrelgauge viewer"

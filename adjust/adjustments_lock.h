@@ -4,7 +4,7 @@
 
 #include <string>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 ErrorCode lockAdjustmentsFile(const std::string& path);
 ErrorCode unlockAdjustmentsFile(const std::string& path);

@@ -5,9 +5,9 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
 #include "adjust/source_prompter.h"
 #include "adjust/src_file.h"
+#include "support/errors.h"
 
 // One line of the window: its count column text and its source text in display form.
 struct AnnotatedLine {

@@ -10,7 +10,7 @@
 
 #include "adjust/adjustment_list.h"
 #include "coverage/summary_build.h"
-#include "startup/atomic_write.h"
+#include "support/atomic_write.h"
 
 namespace {
 

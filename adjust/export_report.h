@@ -6,8 +6,8 @@
 #include <ctime>
 #include <string>
 
-#include "adjust/errors.h"
 #include "coverage/summary_types.h"
+#include "support/errors.h"
 
 // Writes the report with the current local time in its header. A reader that closes its
 // end early (broken pipe) is no failure; other write failures give fileWriteFailed with the

@@ -10,8 +10,8 @@
 #include "adjust/adjustments_file.h"
 #include "adjust/code_set.h"
 #include "adjust/marker_scanner.h"
-#include "adjust/string_format.h"
 #include "coverage/summary_build.h"
+#include "support/string_helpers.h"
 
 std::string manyFilesMessage(const std::string& format, unsigned long files,
                              unsigned long threshold) {

@@ -6,8 +6,8 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
 #include "coverage/summary_types.h"
+#include "support/errors.h"
 
 // The question asked before a long extraction. The console goes on without asking.
 class ExtractionQuestion {

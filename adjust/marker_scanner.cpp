@@ -1,7 +1,7 @@
 // Marker grammar, range bookkeeping and the scanner's warnings.
 #include "adjust/marker_scanner.h"
 
-#include "adjust/string_format.h"
+#include "support/string_helpers.h"
 
 namespace {
 

@@ -4,7 +4,7 @@
 
 #include <string>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 class SourcePrompter {
  public:

@@ -13,7 +13,7 @@
 #include "adjust/adjust_settings.h"
 #include "adjust/code_set.h"
 #include "adjust/source_search_path.h"
-#include "startup/diagnostic.h"
+#include "support/temp_file.h"
 
 namespace {
 
@@ -42,41 +42,6 @@ void closeFile(FILE*& f) {
 }
 
 }  // namespace
-
-FILE* createTemporaryFile(const char* prefix, std::string& path) {
-  std::string dir = kgTempDirectory();
-  if (dir.empty()) dir = ".";
-  std::string templ = dir + (dir.back() == '/' ? "" : "/") + prefix + "XXXXXX";
-  std::vector<char> buf(templ.begin(), templ.end());
-  buf.push_back('\0');
-  int fd = mkstemp(buf.data());
-  if (fd < 0) {
-    path = templ;
-    return nullptr;
-  }
-  path = buf.data();
-  FILE* f = fdopen(fd, "w+");
-  if (!f) {
-    int err = errno;
-    close(fd);
-    unlink(path.c_str());
-    errno = err;
-  }
-  return f;
-}
-
-std::string writeTargetFor(const std::string& path) {
-  struct stat st;
-  if (lstat(path.c_str(), &st) == 0 && S_ISLNK(st.st_mode)) {
-    char* real = realpath(path.c_str(), nullptr);
-    if (real) {
-      std::string r = real;
-      free(real);
-      return r;
-    }
-  }
-  return path;
-}
 
 SrcFile::~SrcFile() {
   closeStreams();

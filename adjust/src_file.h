@@ -6,9 +6,9 @@
 #include <cstdio>
 #include <string>
 
-#include "adjust/errors.h"
 #include "adjust/source_prompter.h"
-#include "startup/atomic_write.h"
+#include "support/atomic_write.h"
+#include "support/errors.h"
 
 class SrcFile {
  public:
@@ -71,12 +71,3 @@ class SrcFile {
   AtomicFileWriter writer_;
   bool writeFailed_ = false;
 };
-
-// A temporary file in the temporary directory, created safely with a unique name that
-// begins with the prefix, open for reading and writing. nullptr on failure (errno set;
-// path then holds the name pattern).
-FILE* createTemporaryFile(const char* prefix, std::string& path);
-
-// Where writing to `path` must go so that a symbolic link keeps pointing at the new file:
-// the link's real target, or the path itself.
-std::string writeTargetFor(const std::string& path);

@@ -5,6 +5,7 @@
 #include <cstring>
 #include <string>
 
+#include "startup/console_report.h"
 #include "startup/merge_mode.h"
 #include "startup/startup.h"
 

@@ -9,7 +9,7 @@
 #include <string_view>
 #include <vector>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 constexpr std::uint32_t kKgvMagic = 0xACC01ADE;
 constexpr std::uint32_t kKgvMagic2 = 0xB01DFACE;

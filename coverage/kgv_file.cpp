@@ -12,7 +12,7 @@
 #include <sys/uio.h>
 #include <unistd.h>
 
-#include "startup/atomic_write.h"
+#include "support/atomic_write.h"
 
 namespace {
 

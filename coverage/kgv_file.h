@@ -5,8 +5,8 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
 #include "coverage/kgv_data.h"
+#include "support/errors.h"
 
 // The header checks on the 88 header bytes as read from a file: 1, 25 (not a data file),
 // 27 (version refused; the version detail is recorded) or 53 (the other product's file).

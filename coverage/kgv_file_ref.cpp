@@ -7,8 +7,8 @@
 #include <climits>
 #include <cstdlib>
 
-#include "startup/diagnostic.h"
-#include "startup/runtime_options.h"
+#include "support/diagnostic.h"
+#include "support/runtime_options.h"
 
 namespace {
 

@@ -6,9 +6,9 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
 #include "coverage/kgv_data.h"
 #include "coverage/kgv_file_ref.h"
+#include "support/errors.h"
 
 // Locks the file named by the reference's given name, reads it, unlocks it; on success the
 // reference's loadTime becomes the current time.

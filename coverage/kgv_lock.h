@@ -5,7 +5,7 @@
 #include <functional>
 #include <string>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 enum LockEvent : int {
   LockEventWait = 1,   // about to wait one second for a busy lock

@@ -8,8 +8,8 @@
 #include <unordered_map>
 #include <vector>
 
-#include "adjust/errors.h"
 #include "coverage/kgv_data.h"
+#include "support/errors.h"
 
 constexpr std::uint32_t kMergeNewestWins = 1;
 constexpr std::uint32_t kMergeForce = 2;

@@ -8,7 +8,7 @@
 #include <string_view>
 #include <vector>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 class StringBlock {
  public:

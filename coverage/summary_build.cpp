@@ -3,7 +3,6 @@
 #include "coverage/summary_build.h"
 
 #include <algorithm>
-#include <cctype>
 #include <cstdio>
 #include <cstdlib>
 #include <new>
@@ -13,6 +12,7 @@
 
 #include "coverage/string_block.h"
 #include "coverage/summary_sort.h"
+#include "support/string_helpers.h"
 
 namespace {
 
@@ -365,18 +365,6 @@ ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustInd
   return allOK;
 }
 
-bool namesEqualIgnoringDashes(const char* a, const char* b) {
-  for (;;) {
-    while (*a == '-' || *a == '_') ++a;
-    while (*b == '-' || *b == '_') ++b;
-    if (!*a || !*b) return *a == *b;
-    if (std::tolower(static_cast<unsigned char>(*a)) != std::tolower(static_cast<unsigned char>(*b)))
-      return false;
-    ++a;
-    ++b;
-  }
-}
-
 // The old records of one level by name, for matching in order with wrap-around.
 template <typename Record>
 class NameMatcher {
@@ -416,7 +404,7 @@ std::uint32_t hitsPolicyFromText(const char* value) {
   if (!value || !*value) return hitsMax;
   static const char* const names[] = {"max", "min", "first", "last"};
   for (std::uint32_t i = 0; i < 4; ++i) {
-    if (namesEqualIgnoringDashes(value, names[i])) return i + 1;
+    if (optionNamesMatch(value, names[i])) return i + 1;
   }
   return hitsMax;
 }

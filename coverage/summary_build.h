@@ -9,9 +9,9 @@
 #include <vector>
 
 #include "adjust/adjustment_list.h"
-#include "adjust/errors.h"
 #include "coverage/kgv_data.h"
 #include "coverage/summary_types.h"
+#include "support/errors.h"
 
 // How the hits of several blocks on one line combine into the line's count.
 enum HitsPolicy : std::uint32_t { hitsMax = 1, hitsMin = 2, hitsFirst = 3, hitsLast = 4 };

@@ -4,8 +4,8 @@
 
 #include <cstdint>
 
-#include "adjust/errors.h"
 #include "coverage/summary_types.h"
+#include "support/errors.h"
 
 // What a comparison sees of a directory, file or function record.
 struct SortKey {

@@ -3,7 +3,7 @@
 
 #include <string>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 struct EnumWord;
 

@@ -3,10 +3,10 @@
 
 #include <cstdlib>
 
-#include "adjust/errors.h"
 #include "settings/kg_resource.h"
 #include "settings/resource_converters.h"
 #include "settings/resource_table.h"
+#include "support/errors.h"
 
 std::vector<std::string> loadResourceSettings(const ResourceSettingsInput& in) {
   std::vector<std::string> warnings;

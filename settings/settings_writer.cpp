@@ -17,7 +17,7 @@
 #include "settings/kg_resource.h"
 #include "settings/resource_database.h"
 #include "settings/resource_table.h"
-#include "startup/atomic_write.h"
+#include "support/atomic_write.h"
 
 namespace {
 

@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 // What an operation leaves for the GUI. On failure the error dialog shows
 // errorDialogText(context, code): context is the user's text for messageName, or its default.

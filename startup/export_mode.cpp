@@ -4,6 +4,7 @@
 #include <cstdio>
 
 #include "adjust/export_report.h"
+#include "startup/console_report.h"
 #include "startup/merge_mode.h"
 
 ErrorCode runExportMode(StartupSummary& prepared) {

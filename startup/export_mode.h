@@ -2,8 +2,8 @@
 // report on standard output.
 #pragma once
 
-#include "adjust/errors.h"
 #include "startup/startup.h"
+#include "support/errors.h"
 
 // Runs after the summary is built: reports data set aside and problems with the
 // adjustments file on standard error, then writes the report to standard output. A reader

@@ -6,6 +6,7 @@
 
 #include "adjust/adjustments_file.h"
 #include "adjust/extraction.h"
+#include "startup/console_report.h"
 #include "startup/merge_mode.h"
 
 ErrorCode runExtractMode(StartupSummary& prepared) {

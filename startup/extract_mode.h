@@ -3,8 +3,8 @@
 // result lines on standard output.
 #pragma once
 
-#include "adjust/errors.h"
 #include "startup/startup.h"
+#include "support/errors.h"
 
 // Runs after the summary is built. A failure to write the adjustments file is reported on
 // standard error and its code returned; otherwise 1.

@@ -5,6 +5,7 @@
 
 #include "coverage/kgv_load.h"
 #include "coverage/kgv_lock.h"
+#include "startup/console_report.h"
 
 ErrorCode loadStartupFiles(StartupState& s, std::unique_ptr<KgvData>& data,
                            std::vector<std::string>& ignored) {

@@ -6,9 +6,9 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
 #include "coverage/kgv_data.h"
 #include "startup/startup.h"
+#include "support/errors.h"
 
 // Installs the console lock-wait reporter, sets the lock-breaking age to 45 seconds and
 // locking on or off from s.lockingEnabled, then loads and merges s.loadedFiles with

@@ -3,6 +3,7 @@
 
 #include "coverage/kgv_file.h"
 #include "coverage/kgv_lock.h"
+#include "startup/console_report.h"
 #include "startup/load_files.h"
 
 void reportOutOfDate(const std::vector<std::string>& ignored) {

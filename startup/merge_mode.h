@@ -5,8 +5,8 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
 #include "startup/startup.h"
+#include "support/errors.h"
 
 // Runs after the common start-up steps (options parsed, file list built). OUT's lock is
 // held from before the files are read until the result is in place, so runs added to OUT

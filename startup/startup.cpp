@@ -12,14 +12,15 @@
 #include "adjust/adjustments_file.h"
 #include "coverage/summary_build.h"
 #include "coverage/summary_sort.h"
-#include "startup/diagnostic.h"
+#include "settings/settings_startup.h"
+#include "startup/console_report.h"
 #include "startup/export_mode.h"
 #include "startup/extract_mode.h"
 #include "startup/load_files.h"
 #include "startup/merge_mode.h"
-#include "settings/settings_startup.h"
-#include "startup/runtime_options.h"
 #include "startup/settings_wiring.h"
+#include "support/diagnostic.h"
+#include "support/runtime_options.h"
 
 StartupState& startupState() {
   static StartupState s;

@@ -6,11 +6,11 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
 #include "coverage/kgv_data.h"
 #include "coverage/kgv_file_ref.h"
 #include "coverage/summary_types.h"
 #include "startup/viewer_options.h"
+#include "support/errors.h"
 
 enum class RunMode { view, exportReport, merge, extract };
 

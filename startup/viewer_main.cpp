@@ -5,10 +5,11 @@
 #include <cstdlib>
 #include <cstring>
 
-#include "adjust/errors.h"
-#include "startup/diagnostic.h"
+#include "startup/console_report.h"
 #include "startup/startup.h"
 #include "summary/sum_frame.h"
+#include "support/diagnostic.h"
+#include "support/errors.h"
 
 namespace {
 

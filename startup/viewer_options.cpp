@@ -1,10 +1,11 @@
 // Viewer option table, name matching and the command-line parser.
 #include "startup/viewer_options.h"
 
-#include <cctype>
 #include <cstring>
 
-#include "startup/runtime_options.h"
+#include "startup/console_report.h"
+#include "support/runtime_options.h"
+#include "support/string_helpers.h"
 
 std::vector<ViewerOption> makeViewerOptionTable() {
   std::vector<ViewerOption> t;
@@ -20,18 +21,6 @@ std::vector<ViewerOption> makeViewerOptionTable() {
   for (int i = 0; i < kRuntimeOptionCount; ++i) t.push_back({rt[i].name, optValueOptional, optNotGiven, {}});
   t.push_back({"ignore_this_kestrel_arg", optValueOptional, optNotGiven, {}});
   return t;
-}
-
-bool optionNamesMatch(const char* a, const char* b) {
-  for (;;) {
-    while (*a == '-' || *a == '_') ++a;
-    while (*b == '-' || *b == '_') ++b;
-    if (*a == '\0' || *b == '\0') return *a == *b;
-    if (tolower(static_cast<unsigned char>(*a)) != tolower(static_cast<unsigned char>(*b)))
-      return false;
-    ++a;
-    ++b;
-  }
 }
 
 namespace {

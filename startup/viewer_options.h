@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 struct ViewerOption {
   std::string name;          // as written after the hyphen
@@ -21,9 +21,6 @@ constexpr int kViewerOptionRows = 403;
 
 // A fresh table: the ten viewer options, the runtime options' names, ignore_this_kestrel_arg.
 std::vector<ViewerOption> makeViewerOptionTable();
-
-// Names match ignoring case and any runs of '-' and '_'.
-bool optionNamesMatch(const char* a, const char* b);
 
 // Takes the options (and empty arguments) out of argv, from argv[0] on; argc shrinks.
 // Returns allOK, or argError when any option was in error (each reported).

@@ -8,13 +8,13 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
 #include "coverage/kgv_data.h"
 #include "coverage/summary_types.h"
 #include "outline/qr_outline_root.h"
 #include "outline/qr_outline_text.h"
 #include "summary/kg_columns.h"
 #include "summary/name_style.h"
+#include "support/errors.h"
 
 // What the rows ask of the window around them; each may be left empty (tests, no window).
 struct KG_SummaryHooks {

@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 struct SortOrderInfo {
   std::uint32_t id;

@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 #include "toolkit/oi_dialogs.h"
 
 // The window dialogs go over when the caller names none (the main window once it exists).

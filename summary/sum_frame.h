@@ -9,10 +9,10 @@
 #include <string>
 #include <vector>
 
-#include "adjust/errors.h"
 #include "coverage/kgv_data.h"
 #include "coverage/summary_types.h"
 #include "startup/startup.h"
+#include "support/errors.h"
 
 class KG_OutlineRoot;
 class KG_SummaryOverall;

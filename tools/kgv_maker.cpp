@@ -9,7 +9,7 @@
 #include <unordered_map>
 #include <vector>
 
-#include "startup/atomic_write.h"
+#include "support/atomic_write.h"
 
 namespace {
 

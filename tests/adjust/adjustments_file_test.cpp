@@ -14,7 +14,7 @@
 #include <vector>
 
 #include "adjust/adjustments_file.h"
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 namespace {
 

@@ -5,7 +5,7 @@
 #include <deque>
 
 #include "adjust/annotated_listing.h"
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 namespace {
 

@@ -9,7 +9,7 @@
 #include <string>
 
 #include "adjust/code_set.h"
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 namespace {
 

@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "adjust/marker_scanner.h"
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 namespace {
 

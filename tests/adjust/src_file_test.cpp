@@ -16,8 +16,9 @@
 #include "adjust/code_set.h"
 #include "adjust/source_search_path.h"
 #include "adjust/src_file.h"
-#include "startup/diagnostic.h"
-#include "tests/support/test_support.h"
+#include "support/diagnostic.h"
+#include "support/temp_file.h"
+#include "tests/common/test_support.h"
 
 namespace {
 

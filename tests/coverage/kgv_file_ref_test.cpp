@@ -4,8 +4,8 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
-#include "startup/runtime_options.h"
-#include "tests/support/test_support.h"
+#include "support/runtime_options.h"
+#include "tests/common/test_support.h"
 
 namespace {
 

@@ -11,7 +11,7 @@
 #include <string>
 
 #include "coverage/kgv_file.h"
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 #include "tools/kgv_maker.h"
 
 namespace kgtest {

@@ -8,7 +8,7 @@
 #include "settings/resource_database.h"
 #include "settings/settings_writer.h"
 #include "settings_test_util.h"
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 using kgtest::settingsFrom;
 using kgtest::TextDatabase;

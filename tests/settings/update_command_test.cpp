@@ -11,7 +11,7 @@
 
 #include "settings/settings_writer.h"
 #include "settings_test_util.h"
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 namespace {
 

@@ -7,7 +7,7 @@
 #include <cstdlib>
 #include <cstring>
 
-#include "startup/diagnostic.h"
+#include "support/diagnostic.h"
 
 namespace {
 void cleanup(void*) { write(2, "cleanup ran\n", 12); }

@@ -1,9 +1,8 @@
-// The viewer option parser and the runtime option accessors.
+// The viewer option parser.
 #include <gtest/gtest.h>
 
 #include <cstring>
 
-#include "startup/runtime_options.h"
 #include "startup/viewer_options.h"
 
 namespace {
@@ -26,28 +25,6 @@ struct Args {
 };
 
 }  // namespace
-
-TEST(ViewerOptions, TableHasTheViewerOptionsThenTheRuntimeNames) {
-  auto t = makeViewerOptionTable();
-  ASSERT_EQ(t.size(), 403u);
-  EXPECT_EQ(t[0].name, "sort");
-  EXPECT_EQ(t[0].kind, 3u);
-  EXPECT_EQ(t[6].name, "locking");
-  EXPECT_EQ(t[6].kind, 2u);
-  EXPECT_EQ(t[9].name, "applyadjustments");
-  EXPECT_EQ(t[10].name, "DUMMY_OPTION");
-  EXPECT_EQ(t[10 + KESTREL_HOME].name, "KESTREL_HOME");
-  EXPECT_EQ(t[10 + QUOR_HELP_MAX_WAIT].name, "QUOR_HELP_MAX_WAIT");
-  EXPECT_EQ(t[402].name, "ignore_this_kestrel_arg");
-}
-
-TEST(ViewerOptions, NamesMatchIgnoringCaseHyphensAndUnderscores) {
-  EXPECT_TRUE(optionNamesMatch("-force-merge", "forcemerge"));
-  EXPECT_TRUE(optionNamesMatch("FORCE_MERGE", "-force-merge"));
-  EXPECT_TRUE(optionNamesMatch("--_lock-ing", "locking"));
-  EXPECT_FALSE(optionNamesMatch("forcemerg", "forcemerge"));
-  EXPECT_FALSE(optionNamesMatch("sorts", "sort"));
-}
 
 TEST(ViewerOptions, ParsingRecordsFirstOccurrencesAndCompactsTheVector) {
   testing::internal::CaptureStderr();
@@ -109,24 +86,4 @@ TEST(ViewerOptions, RawValuesAndQuotesBeforeParsing) {
   ASSERT_TRUE(findRawOptionValue(a.argc, a.ptrs.data(), "kestrelhome", v));
   EXPECT_EQ(v, "/opt/kg");
   EXPECT_FALSE(findRawOptionValue(a.argc, a.ptrs.data(), "sort", v));
-}
-
-TEST(RuntimeOptions, DefaultsSettingAndTypeChecks) {
-  resetRuntimeOptions();
-  EXPECT_FALSE(getBoolOption(KESTREL));
-  setOption(KESTREL, 1);
-  EXPECT_TRUE(getBoolOption(KESTREL));
-  EXPECT_EQ(getStringOption(KESTREL_HOME), nullptr);
-  setStringOption(KESTREL_HOME, "/opt/kg");
-  EXPECT_STREQ(getStringOption(KESTREL_HOME), "/opt/kg");
-  EXPECT_EQ(getIntOption(QUOR_HELP_MAX_WAIT), 20);
-  EXPECT_STREQ(getStringOption(AUTO_MOUNT_PREFIX), "/tmp_mnt");
-  EXPECT_EXIT(getIntOption(KESTREL_HOME), testing::ExitedWithCode(1),
-              "Internal error: option kestrel-home is not an integer option\\.");
-  EXPECT_EXIT(getBoolOption(AUTO_MOUNT_PREFIX), testing::ExitedWithCode(1),
-              "option auto-mount-prefix is not a boolean option");
-  EXPECT_EXIT(getUnsignedOption(QUOR_HELP_MAX_WAIT), testing::ExitedWithCode(1),
-              "option quor-help-max-wait is not an unsigned integer option");
-  EXPECT_EXIT(getOption(392), testing::ExitedWithCode(1), "option index 392 out of range");
-  resetRuntimeOptions();
 }

@@ -6,7 +6,7 @@
 #include <regex>
 
 #include "coverage/kgv_file.h"
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 using kgtest::runProcess;
 

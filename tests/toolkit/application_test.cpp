@@ -9,7 +9,7 @@
 
 #include "outline/qr_oi_multi_text.h"
 #include "outline/qr_oi_scroll_text.h"
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 #include "toolkit/oi_application.h"
 #include "toolkit/oi_controls.h"
 #include "toolkit/oi_grid_box.h"

@@ -10,7 +10,7 @@
 #include <string>
 #include <vector>
 
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 namespace kgtest {
 

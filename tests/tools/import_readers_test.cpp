@@ -3,7 +3,7 @@
 #include <gtest/gtest.h>
 #include <zlib.h>
 
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 #include "tools/import/coverage_import.h"
 #include "tools/import/record_layout.h"
 

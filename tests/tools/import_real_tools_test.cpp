@@ -4,7 +4,7 @@
 #include <map>
 
 #include "coverage/kgv_file.h"
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 using kgtest::runProcess;
 

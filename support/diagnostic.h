@@ -1,5 +1,5 @@
 // Console diagnostics: severity-tagged messages, fatal stops, clean-up actions,
-// checked allocation, language and temporary-directory settings, fatal-signal report.
+// checked allocation, the language setting, fatal-signal report.
 #pragma once
 
 #include <cstddef>
@@ -77,11 +77,6 @@ void StrcatnDots(char* dst, const char* src, int n, int capacity);
 size_t kgStrlen(const char* s);
 int kgStrcmp(const char* a, const char* b);
 int kgStrncmp(const char* a, const char* b, size_t n);
-
-// TMPDIR when set (even empty), else "/tmp"; computed once.
-const char* kgTempDirectory();
-// Forgets the computed value (tests change TMPDIR between cases).
-void kgResetTempDirectory();
 
 // 0 = English, 1 = Japanese, from the argument or the locale variables.
 int kgChooseLanguage(const char* name);

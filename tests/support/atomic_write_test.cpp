@@ -1,10 +1,10 @@
 // Writing a user's file through a temporary file: success replaces, failure keeps.
-#include "startup/atomic_write.h"
+#include "support/atomic_write.h"
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 TEST(AtomicWrite, ReplacesTheTargetAndKeepsItsPermissions) {
   kgtest::TempDir dir;

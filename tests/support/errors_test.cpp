@@ -1,5 +1,5 @@
 // Error texts, the pending system error and the dialog wrapping.
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 #include <gtest/gtest.h>
 
@@ -14,21 +14,6 @@ TEST(ErrorMessages, PendingSystemErrorIsAttachedToExactlyOneMessage) {
                        strerror(ENOENT) + ")");
   EXPECT_EQ(errorMessage(lockDirNotCreated), errorShortText(lockDirNotCreated));
   EXPECT_EQ(errorMessage(allOK), "Everything was OK.");
-}
-
-TEST(ErrorMessages, TableFormsAndIdentifiers) {
-  EXPECT_STREQ(errorText(errorOccured), "An error occured");
-  EXPECT_STREQ(errorShortText(errorOccured), "An error occurred.");
-  EXPECT_STREQ(errorIdentifier(unabelToLock), "unabelToLock");
-  EXPECT_EQ(errorIdentifier(displayNotOpened), nullptr);
-  EXPECT_EQ(errorIdentifier(incompatibleVersion), nullptr);
-  EXPECT_STREQ(errorIdentifier(4), "fatalInternalError");
-  EXPECT_STREQ(errorText(32), errorText(noSubshell));
-  EXPECT_STREQ(errorText(55), "");
-  EXPECT_STREQ(errorText(7), "");
-  // The short form of code 36 breaks the line where the console needs it.
-  EXPECT_STREQ(errorShortText(mergeIgnored),
-               "Some data were ignored because they were from\nan old version of your program.");
 }
 
 TEST(ErrorMessages, UserTextReplacesTableTextByIdentifier) {
@@ -59,11 +44,4 @@ TEST(DialogWrapping, BreaksAtLastBlankWithinSixtyOneCharacters) {
     start = nl + 1;
   }
   EXPECT_EQ(errorDialogText("Couldn't export", allOK), "Couldn't export:\n Everything was OK.");
-}
-
-TEST(ExitStatus, MapsCodes) {
-  EXPECT_EQ(exitStatusFor(allOK), 0);
-  EXPECT_EQ(exitStatusFor(fatalInternalError), 3);
-  EXPECT_EQ(exitStatusFor(invalidSortingOrder), 42);
-  EXPECT_EQ(exitStatusFor(256), 3);
 }

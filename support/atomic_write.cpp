@@ -1,11 +1,12 @@
 // Temporary file beside the target, renamed over it on success.
-#include "startup/atomic_write.h"
+#include "support/atomic_write.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstdlib>
 #include <vector>
 
 AtomicFileWriter::~AtomicFileWriter() { abandon(); }
@@ -81,4 +82,17 @@ void AtomicFileWriter::abandon() {
     unlink(temp_.c_str());
     temp_.clear();
   }
+}
+
+std::string writeTargetFor(const std::string& path) {
+  struct stat st;
+  if (lstat(path.c_str(), &st) == 0 && S_ISLNK(st.st_mode)) {
+    char* real = realpath(path.c_str(), nullptr);
+    if (real) {
+      std::string r = real;
+      free(real);
+      return r;
+    }
+  }
+  return path;
 }

@@ -15,7 +15,7 @@
 #include <string>
 #include <vector>
 
-#include "startup/diagnostic.h"
+#include "support/diagnostic.h"
 
 namespace diag {
 const std::vector<std::string>& priorInformation();

@@ -1,5 +1,6 @@
 // Console diagnostics: layout, limits, current file, clean-up and settings.
-#include "startup/diagnostic.h"
+#include "support/diagnostic.h"
+#include "support/temp_file.h"
 
 #include <gtest/gtest.h>
 

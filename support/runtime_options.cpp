@@ -1,11 +1,11 @@
 // The runtime option table and its checked accessors.
-#include "startup/runtime_options.h"
+#include "support/runtime_options.h"
 
 #include <cstring>
 #include <list>
 #include <string>
 
-#include "startup/diagnostic.h"
+#include "support/diagnostic.h"
 
 namespace {
 

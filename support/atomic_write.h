@@ -5,7 +5,7 @@
 #include <cstdio>
 #include <string>
 
-#include "adjust/errors.h"
+#include "support/errors.h"
 
 class AtomicFileWriter {
  public:
@@ -33,3 +33,7 @@ class AtomicFileWriter {
   std::string temp_;
   FILE* stream_ = nullptr;
 };
+
+// Where writing to `path` must go so that a symbolic link keeps pointing at the new file:
+// the link's real target, or the path itself.
+std::string writeTargetFor(const std::string& path);

@@ -1,5 +1,5 @@
 // Scratch directories, file helpers and a process runner for the tests.
-#include "tests/support/test_support.h"
+#include "tests/common/test_support.h"
 
 #include <fcntl.h>
 #include <poll.h>

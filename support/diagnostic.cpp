@@ -1,5 +1,5 @@
 // Console diagnostics: message layout, limits, clean-up actions, checked allocation.
-#include "startup/diagnostic.h"
+#include "support/diagnostic.h"
 
 #include <cxxabi.h>
 #include <execinfo.h>
@@ -453,22 +453,6 @@ int kgStrncmp(const char* a, const char* b, size_t n) {
 }
 
 // ---- settings ----
-
-namespace {
-bool gTempComputed = false;
-std::string gTempDir;
-}  // namespace
-
-const char* kgTempDirectory() {
-  if (!gTempComputed) {
-    const char* t = getenv("TMPDIR");
-    gTempDir = t ? t : "/tmp";
-    gTempComputed = true;
-  }
-  return gTempDir.c_str();
-}
-
-void kgResetTempDirectory() { gTempComputed = false; }
 
 int kgChooseLanguage(const char* name) {
   const char* value = (name && *name) ? name : nullptr;

@@ -1,4 +1,4 @@
-// Error codes of the engine and file operations, their texts, and the console report.
+// Error codes of the engine and file operations, their texts and message forms.
 #pragma once
 
 #include <cstdint>
@@ -89,16 +89,3 @@ std::string errorMessageWithName(ErrorCode code);
 std::string wrapDialogText(const std::string& text);
 // "%s:\n %s": the context, then the wrapped resource form of the code's message.
 std::string errorDialogText(const std::string& context, ErrorCode code);
-
-// Console report: "Kestrelgauge: " + text, a newline if missing, then an empty line.
-void reportError(ErrorCode code, const char* fmt, ...) __attribute__((format(printf, 2, 3)));
-
-// How the product's command must be started; printed when the installation directory is missing.
-extern const char* const kUsageErrorText;
-// Prints the usage error and exits with status 11.
-[[noreturn]] void usageError();
-
-// The process exit status of a result code: 1 -> 0, 0 -> 3, any other code as it is.
-int exitStatusFor(ErrorCode code);
-// Flushes the standard streams and ends the process with the status of the code.
-[[noreturn]] void exitWithCode(ErrorCode code);

@@ -1,5 +1,5 @@
-// Error code table, pending system error, message forms and the console report.
-#include "adjust/errors.h"
+// Error code table, pending system error and message forms.
+#include "support/errors.h"
 
 #include <cerrno>
 #include <cstdarg>
@@ -204,49 +204,4 @@ std::string wrapDialogText(const std::string& text) {
 
 std::string errorDialogText(const std::string& context, ErrorCode code) {
   return context + ":\n " + wrapDialogText(errorMessageWithName(code));
-}
-
-void reportError(ErrorCode, const char* fmt, ...) {
-  fflush(stdout);
-  fputs("Kestrelgauge: ", stderr);
-  va_list ap;
-  va_start(ap, fmt);
-  char* text = nullptr;
-  int n = vasprintf(&text, fmt, ap);
-  va_end(ap);
-  if (n >= 0 && text) {
-    fputs(text, stderr);
-    if (n == 0 || text[n - 1] != '\n') fputc('\n', stderr);
-    free(text);
-  } else {
-    fputc('\n', stderr);
-  }
-  fputc('\n', stderr);
-  fflush(stderr);
-}
-
-const char* const kUsageErrorText =
-    "Kestrelgauge must be invoked in one of these forms:\n"
-    "    kestrel -view\n"
-    "    kestrel -export\n"
-    "    kestrel -merge=<file>\n"
-    "    kestrel -extract\n"
-    "For additional information, use 'kestrel -help'.\n";
-
-void usageError() {
-  reportError(driverError, "%s", kUsageErrorText);
-  exitWithCode(driverError);
-}
-
-int exitStatusFor(ErrorCode code) {
-  if (code == allOK) return 0;
-  if (code == fatalInternalError) return 3;
-  // A status has 8 bits; a code that does not fit must not read as success.
-  return code > 255 ? 3 : static_cast<int>(code);
-}
-
-void exitWithCode(ErrorCode code) {
-  fflush(stdout);
-  fflush(stderr);
-  exit(exitStatusFor(code));
 }

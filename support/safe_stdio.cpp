@@ -1,10 +1,10 @@
 // Checked standard I/O with descriptor names for the messages.
-#include "startup/safe_stdio.h"
+#include "support/safe_stdio.h"
 
 #include <cerrno>
 #include <string>
 
-#include "startup/diagnostic.h"
+#include "support/diagnostic.h"
 
 namespace {
 std::string gNames[64];

@@ -1,0 +1,18 @@
+// Start-up's console reporting: the "Kestrelgauge: " messages of failures, the usage error
+// and the exit with the status of a result code.
+#pragma once
+
+#include "support/errors.h"
+
+// Console report: "Kestrelgauge: " + text, a newline if missing, then an empty line.
+void reportError(ErrorCode code, const char* fmt, ...) __attribute__((format(printf, 2, 3)));
+
+// How the product's command must be started; printed when the installation directory is missing.
+extern const char* const kUsageErrorText;
+// Prints the usage error and exits with status 11.
+[[noreturn]] void usageError();
+
+// The process exit status of a result code: 1 -> 0, 0 -> 3, any other code as it is.
+int exitStatusFor(ErrorCode code);
+// Flushes the standard streams and ends the process with the status of the code.
+[[noreturn]] void exitWithCode(ErrorCode code);
