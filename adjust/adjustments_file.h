@@ -7,7 +7,7 @@
 #include <string_view>
 #include <vector>
 
-#include "adjust/adjustment_list.h"
+#include "coverage/adjustment_list.h"
 #include "support/errors.h"
 
 extern const char* const kDefaultAdjustmentsFile;  // "~/.kestrel.adjust"

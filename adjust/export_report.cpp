@@ -8,7 +8,7 @@
 #include <new>
 #include <string_view>
 
-#include "adjust/adjustment_list.h"
+#include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
 #include "support/atomic_write.h"
 
@@ -202,7 +202,7 @@ void writeFunction(GuardedWriter& w, const SumFile& file, const std::vector<Line
     for (std::uint32_t l = fn.firstLine; l <= last; ++l) {
       const LineState& s = states[l - 1];
       if (!(s.flags & LineHasCode)) continue;
-      if ((s.flags & kAdjustMask) && lineUnusedDead(s.flags, s.count)) continue;
+      if ((s.flags & adjAnyMask) && lineUnusedDead(s.flags, s.count)) continue;
       w.text("li\t").number(l).tab();
       if (s.count != 0) {
         w.number(saturate(s.count));

@@ -6,10 +6,10 @@
 #include <new>
 
 #include "adjust/adjust_settings.h"
-#include "adjust/adjustment_list.h"
 #include "adjust/adjustments_file.h"
 #include "adjust/code_set.h"
 #include "adjust/marker_scanner.h"
+#include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
 #include "support/string_helpers.h"
 

@@ -5,8 +5,8 @@
 #include <string>
 #include <vector>
 
-#include "adjust/adjustment_list.h"
 #include "adjust/marker_comments.h"
+#include "coverage/adjustment_list.h"
 
 struct LoadedSourceAdjustments {
   std::vector<std::string> warnings;  // shown under compileAdjWindowErrorsPrompt

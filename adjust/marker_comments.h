@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "adjust/cvg_adjust_set.h"
+#include "coverage/cvg_adjust_set.h"
 
 // The few operations on a text that the marker edits need; lines are numbered from 1.
 // The annotated source pane implements it; VectorTextLines serves plain text in memory.

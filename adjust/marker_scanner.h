@@ -8,7 +8,7 @@
 #include <string_view>
 #include <vector>
 
-#include "adjust/cvg_adjust_set.h"
+#include "coverage/cvg_adjust_set.h"
 
 class MarkerScanner {
  public:

@@ -4,18 +4,12 @@
 
 #include <cstdint>
 
+#include "coverage/cvg_adjust.h"
+
 constexpr std::uint32_t LineHasCode = 0x1;    // some block lies on the line
 constexpr std::uint32_t LineFuncStart = 0x2;  // a function begins here
 constexpr std::uint32_t LineFuncEnd = 0x4;    // the last line of a function's data
-
-// Adjustment kinds carried in a line's flags: one-line markers and ranges.
-constexpr std::uint32_t AdjDeadLine = 0x10;
-constexpr std::uint32_t AdjTestedLine = 0x20;
-constexpr std::uint32_t AdjInspectedLine = 0x40;
-constexpr std::uint32_t AdjDeadRange = 0x100;
-constexpr std::uint32_t AdjTestedRange = 0x200;
-constexpr std::uint32_t AdjInspectedRange = 0x400;
-constexpr std::uint32_t kAdjustMask = 0x770;
+// Bits 0x10 to 0x400 carry the line's adjustment kinds (CvgAdjust, adjAnyMask).
 
 enum LineClass : std::uint32_t {
   ClassNothing = 1,
@@ -31,12 +25,6 @@ struct LineState {
   std::uint32_t actualClass = 0;
   std::uint32_t adjustedClass = 0;
 };
-
-// The first present of 0x10, 0x40, 0x20, 0x100, 0x400, 0x200; 0 when none.
-std::uint32_t dominantAdjustment(std::uint32_t flags);
-bool isDeadAdjustment(std::uint32_t kind);
-bool isTestedAdjustment(std::uint32_t kind);
-bool isInspectedAdjustment(std::uint32_t kind);
 
 bool lineHasCode(std::uint32_t flags);
 bool lineUsed(std::uint32_t flags, std::uint16_t count);

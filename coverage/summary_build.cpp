@@ -125,22 +125,7 @@ void FileCounter::account(SumCounts& c, std::uint32_t lineNo, std::uint16_t hits
     return;
   }
   ++c.unusedLines;
-  std::uint32_t bits = adjustBits(set_, lineNo);
-  if (bits == 0) {
-    ++c.adjLines;
-    ++c.adjUnusedLines;
-    return;
-  }
-  std::uint32_t d = dominantAdjustment(bits);
-  if (isDeadAdjustment(d)) {
-    ++c.deadLines;
-  } else if (isTestedAdjustment(d)) {
-    ++c.testedLines;
-    ++c.adjLines;
-  } else if (isInspectedAdjustment(d)) {
-    ++c.inspectedLines;
-    ++c.adjLines;
-  }
+  countUnusedLine(c, dominantAdjust(adjustBits(set_, lineNo)));
 }
 
 ErrorCode FileCounter::run() {
@@ -257,7 +242,7 @@ void classifyLines(std::vector<LineState>& states) {
     bool used = code && s.count != 0;
     bool adjRelevant = code, adjGood = used;
     // Lines without adjustments (nearly all) are decided here; the others by the predicates.
-    if (flags & kAdjustMask) {
+    if (flags & adjAnyMask) {
       adjRelevant = lineCountsForAdjusted(flags, s.count);
       adjGood = lineAdjustedUsed(flags, s.count);
     }

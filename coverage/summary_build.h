@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-#include "adjust/adjustment_list.h"
+#include "coverage/adjustment_list.h"
 #include "coverage/kgv_data.h"
 #include "coverage/summary_types.h"
 #include "support/errors.h"

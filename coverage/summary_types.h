@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <vector>
 
+#include "coverage/cvg_adjust.h"
 #include "coverage/kgv_data.h"
 #include "coverage/line_state.h"
 
@@ -24,6 +25,14 @@ struct SumCounts {
   std::uint32_t usedBlocks() const { return blocks - unusedBlocks; }
   SumCounts& operator+=(const SumCounts& o);
 };
+
+// How an unused line counts under its dominant adjustment kind (0: none): without one it
+// counts for adjusted coverage and as adjusted-unused; dead code leaves adjusted coverage;
+// tested and inspected lines count for it as used. Adds the line's share to the counts.
+void countUnusedLine(SumCounts& c, CvgAdjust dominantKind);
+// An unused line's adjustment changes from one kind (0: none) to another: the counts move
+// by the difference of the two shares, none of them below 0 whatever order changes come in.
+void moveUnusedLine(SumCounts& c, CvgAdjust from, CvgAdjust to);
 
 struct SumDir;
 struct SumFile;

@@ -8,8 +8,8 @@
 #include <cstdlib>
 #include <cstring>
 
-#include "adjust/adjustment_list.h"
 #include "adjust/adjustments_file.h"
+#include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
 #include "coverage/summary_sort.h"
 #include "settings/settings_startup.h"

@@ -4,7 +4,7 @@
 #include <algorithm>
 #include <string_view>
 
-#include "adjust/adjustment_list.h"
+#include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
 #include "coverage/summary_sort.h"
 #include "outline/qr_outline_display.h"
@@ -62,33 +62,7 @@ void adjustFuncCounts(std::uint32_t& deadFuncs, int deadDelta) {
   }
 }
 
-// Counts never wrap below 0, whatever order adjustments arrive in.
-void step(std::uint32_t& v, int d) {
-  if (d < 0 && v == 0) return;
-  v = static_cast<std::uint32_t>(static_cast<long long>(v) + d);
-}
-
 }  // namespace
-
-void kgApplyAdjustmentCount(SumCounts& c, std::uint32_t kind, int sign) {
-  switch (kind) {
-    case kgAdjDeadcode:
-      step(c.deadLines, sign);
-      step(c.adjUnusedLines, -sign);
-      step(c.adjLines, -sign);
-      break;
-    case kgAdjTested:
-      step(c.testedLines, sign);
-      step(c.adjUnusedLines, -sign);
-      break;
-    case kgAdjInspected:
-      step(c.inspectedLines, sign);
-      step(c.adjUnusedLines, -sign);
-      break;
-    default:
-      break;
-  }
-}
 
 std::string kgMessageText(const char* resource, const char* fallback) {
   std::string value;
@@ -370,12 +344,12 @@ ErrorCode KG_SummaryOverall::replace_data(std::unique_ptr<KgvData> data) {
 }
 
 void KG_SummaryOverall::count_adjustment_added(std::uint32_t kind, int deadFunctionDelta) {
-  kgApplyAdjustmentCount(summary_->counts, kind, 1);
+  moveUnusedLine(summary_->counts, 0, kind);
   adjustFuncCounts(summary_->deadFuncs, deadFunctionDelta);
 }
 
 void KG_SummaryOverall::count_adjustment_removed(std::uint32_t kind, int deadFunctionDelta) {
-  kgApplyAdjustmentCount(summary_->counts, kind, -1);
+  moveUnusedLine(summary_->counts, kind, 0);
   adjustFuncCounts(summary_->deadFuncs, deadFunctionDelta);
 }
 
@@ -412,12 +386,12 @@ void KG_SummaryDir::create_children() {
 }
 
 void KG_SummaryDir::count_adjustment_added(std::uint32_t kind, int deadFunctionDelta) {
-  kgApplyAdjustmentCount(dir_->counts, kind, 1);
+  moveUnusedLine(dir_->counts, 0, kind);
   adjustFuncCounts(dir_->deadFuncs, deadFunctionDelta);
 }
 
 void KG_SummaryDir::count_adjustment_removed(std::uint32_t kind, int deadFunctionDelta) {
-  kgApplyAdjustmentCount(dir_->counts, kind, -1);
+  moveUnusedLine(dir_->counts, kind, 0);
   adjustFuncCounts(dir_->deadFuncs, deadFunctionDelta);
 }
 
@@ -469,12 +443,12 @@ std::vector<KG_SummaryFunc*> KG_SummaryFile::functions_at_line(std::uint32_t lin
 }
 
 void KG_SummaryFile::count_adjustment_added(std::uint32_t kind, int deadFunctionDelta) {
-  kgApplyAdjustmentCount(file_->counts, kind, 1);
+  moveUnusedLine(file_->counts, 0, kind);
   adjustFuncCounts(file_->deadFuncs, deadFunctionDelta);
 }
 
 void KG_SummaryFile::count_adjustment_removed(std::uint32_t kind, int deadFunctionDelta) {
-  kgApplyAdjustmentCount(file_->counts, kind, -1);
+  moveUnusedLine(file_->counts, kind, 0);
   adjustFuncCounts(file_->deadFuncs, deadFunctionDelta);
 }
 
@@ -506,7 +480,7 @@ void KG_SummaryFunc::cell_text(std::uint32_t column, std::string& buffer, std::s
 }
 
 void KG_SummaryFunc::adjustment_added(std::uint32_t kind) {
-  kgApplyAdjustmentCount(func_->counts, kind, 1);
+  moveUnusedLine(func_->counts, 0, kind);
   const bool was = func_->allDead;
   func_->allDead = func_->counts.lines > 0 && func_->counts.adjLines == 0;
   const int dead = (!was && func_->allDead) ? 1 : 0;
@@ -520,7 +494,7 @@ void KG_SummaryFunc::adjustment_added(std::uint32_t kind) {
 }
 
 void KG_SummaryFunc::adjustment_removed(std::uint32_t kind) {
-  kgApplyAdjustmentCount(func_->counts, kind, -1);
+  moveUnusedLine(func_->counts, kind, 0);
   const bool was = func_->allDead;
   func_->allDead = func_->counts.lines > 0 && func_->counts.adjLines == 0;
   const int dead = (was && !func_->allDead) ? -1 : 0;

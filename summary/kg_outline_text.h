@@ -31,9 +31,6 @@ std::string kgMessageText(const char* resource, const char* fallback);
 // The name style the settings describe (directory names, truncation, C++ name parts, width).
 NameStyle kgNameStyleFromSettings();
 
-// Adjustment kinds as the counts see them.
-enum : std::uint32_t { kgAdjDeadcode = 16, kgAdjTested = 32, kgAdjInspected = 64 };
-
 class KG_OutlineText : public QR_OutlineText {
  public:
   virtual std::uint32_t level() const = 0;
@@ -176,6 +173,3 @@ class KG_OutlineRoot : public QR_OutlineRoot {
   explicit KG_OutlineRoot(QR_OutlineDisplay* display) : QR_OutlineRoot(display) {}
   KG_SummaryOverall* overall() const;
 };
-
-// The count change of one adjustment on one unused line (sign +1 added, -1 removed).
-void kgApplyAdjustmentCount(SumCounts& c, std::uint32_t kind, int sign);

@@ -4,9 +4,9 @@
 #include <gtest/gtest.h>
 
 #include "adjust/adjust_settings.h"
-#include "adjust/adjustment_list.h"
 #include "adjust/adjustments_file.h"
 #include "adjust/extraction.h"
+#include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
 #include "tests/coverage/kgv_test_util.h"
 

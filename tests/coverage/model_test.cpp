@@ -44,19 +44,19 @@ TEST(StringTable, AnEmptyTableCannotBeFrozen) {
 
 TEST(LineStates, OneLineMarkersDominateRanges) {
   // A tested one-line marker inside a dead-code range: the line is tested, not dead.
-  std::uint32_t flags = LineHasCode | AdjTestedLine | AdjDeadRange;
-  EXPECT_EQ(dominantAdjustment(flags), AdjTestedLine);
+  std::uint32_t flags = LineHasCode | adjLineTested | adjRangeDead;
+  EXPECT_EQ(dominantAdjust(flags), adjLineTested);
   EXPECT_TRUE(lineUnusedTested(flags, 0));
   EXPECT_FALSE(lineUnusedDead(flags, 0));
   EXPECT_TRUE(lineAdjustedUsed(flags, 0));
-  EXPECT_EQ(dominantAdjustment(AdjTestedLine | AdjInspectedLine), AdjInspectedLine);
-  EXPECT_EQ(dominantAdjustment(AdjTestedRange | AdjInspectedRange), AdjInspectedRange);
-  EXPECT_EQ(dominantAdjustment(AdjDeadLine | AdjInspectedLine), AdjDeadLine);
-  EXPECT_EQ(dominantAdjustment(LineHasCode), 0u);
+  EXPECT_EQ(dominantAdjust(adjLineTested | adjLineInspected), adjLineInspected);
+  EXPECT_EQ(dominantAdjust(adjRangeTested | adjRangeInspected), adjRangeInspected);
+  EXPECT_EQ(dominantAdjust(adjLineDead | adjLineInspected), adjLineDead);
+  EXPECT_EQ(dominantAdjust(LineHasCode), 0u);
 }
 
 TEST(LineStates, DeadCodeLeavesAdjustedCoverageOnlyWhileUnused) {
-  std::uint32_t dead = LineHasCode | AdjDeadRange;
+  std::uint32_t dead = LineHasCode | adjRangeDead;
   EXPECT_FALSE(lineCountsForAdjusted(dead, 0));
   EXPECT_FALSE(lineAdjustedUnused(dead, 0));
   EXPECT_TRUE(lineUnusedDead(dead, 0));
@@ -69,7 +69,7 @@ TEST(LineStates, DeadCodeLeavesAdjustedCoverageOnlyWhileUnused) {
   EXPECT_TRUE(lineAdjustedUnused(plain, 0));
   EXPECT_TRUE(lineUnused(plain, 0));
   EXPECT_FALSE(lineUsed(0, 5));  // without code nothing is used
-  EXPECT_FALSE(lineCountsForAdjusted(AdjTestedLine, 0));
+  EXPECT_FALSE(lineCountsForAdjusted(adjLineTested, 0));
 }
 
 TEST(LineStates, CountTexts) {
@@ -79,11 +79,11 @@ TEST(LineStates, CountTexts) {
   EXPECT_STREQ(exportCountText(false, LineHasCode, 65535), "10000");
   EXPECT_STREQ(exportCountText(false, LineHasCode, 9999), "9999");
   EXPECT_STREQ(countText(false, LineHasCode, 7), "7");
-  EXPECT_STREQ(countText(true, LineHasCode | AdjDeadLine, 0), "DEAD");
-  EXPECT_STREQ(countText(true, LineHasCode | AdjTestedRange, 0), "TEST");
-  EXPECT_STREQ(countText(true, LineHasCode | AdjInspectedLine, 0), "INSP");
-  EXPECT_STREQ(countText(false, LineHasCode | AdjDeadLine, 0), "0");
-  EXPECT_STREQ(countText(true, LineHasCode | AdjDeadLine, 2), "2");
+  EXPECT_STREQ(countText(true, LineHasCode | adjLineDead, 0), "DEAD");
+  EXPECT_STREQ(countText(true, LineHasCode | adjRangeTested, 0), "TEST");
+  EXPECT_STREQ(countText(true, LineHasCode | adjLineInspected, 0), "INSP");
+  EXPECT_STREQ(countText(false, LineHasCode | adjLineDead, 0), "0");
+  EXPECT_STREQ(countText(true, LineHasCode | adjLineDead, 2), "2");
 }
 
 TEST(CountArithmetic, CountsSaturateAndFlagsStayFlags) {

@@ -162,7 +162,7 @@ TEST(SummaryAdjusted, DeadTestedAndInspectedLinesCountWhereTheyShould) {
   EXPECT_EQ(fn.counts.adjUnusedLines, 1u);  // 6 only
   EXPECT_FALSE(fn.allDead);
   const auto& ls = onlyFile(*b->root).lineStates;
-  EXPECT_EQ(ls[1].flags & kAdjustMask, std::uint32_t(adjRangeDead));
+  EXPECT_EQ(ls[1].flags & adjAnyMask, std::uint32_t(adjRangeDead));
   EXPECT_EQ(ls[1].actualClass, std::uint32_t(ClassUnused));
   EXPECT_EQ(ls[1].adjustedClass, std::uint32_t(ClassNothing));  // dead: not counted
   EXPECT_EQ(ls[3].adjustedClass, std::uint32_t(ClassUsed));     // tested
@@ -174,7 +174,51 @@ TEST(SummaryAdjusted, DeadTestedAndInspectedLinesCountWhereTheyShould) {
   ASSERT_EQ(recomputeSummary(*b->root, hitsMax, AdjustmentList{}), allOK);
   EXPECT_EQ(fn.counts.adjLines, 5u);
   EXPECT_EQ(fn.counts.adjUnusedLines, 4u);
-  EXPECT_EQ(onlyFile(*b->root).lineStates[1].flags & kAdjustMask, 0u);
+  EXPECT_EQ(onlyFile(*b->root).lineStates[1].flags & adjAnyMask, 0u);
+}
+
+TEST(SummaryAdjusted, MarkingUnusedLinesOneByOneGivesTheCountsOfARebuild) {
+  // The window changes counts line by line as the user marks; a rebuild counts from scratch.
+  // Both must agree for every kind and every mix, and taking marks back restores the counts.
+  std::string text = "record src/m.c\nfunction f line=1 calls=1\n";
+  for (int l = 2; l <= 40; ++l) text += "block " + std::to_string(l) + " hits=" + (l % 7 == 0 ? "2" : "0") + "\n";
+  auto plain = build(text);
+  ASSERT_EQ(plain->rc, allOK);
+  const SumCounts before = onlyFile(*plain->root).functions[0].counts;
+  std::mt19937 random(12);
+  const CvgAdjust kinds[] = {0, adjLineDead, adjLineTested, adjLineInspected, adjRangeDead,
+                             adjRangeTested, adjRangeInspected};
+  for (int round = 0; round < 20; ++round) {
+    SumCounts stepwise = before;
+    auto set = std::make_unique<CvgAdjustSet>();
+    std::vector<std::pair<std::uint32_t, CvgAdjust>> marked;
+    for (std::uint32_t l = 2; l <= 40; ++l) {
+      CvgAdjust k = kinds[random() % 7];
+      if (l % 7 == 0 || k == 0) continue;  // used lines and unmarked ones keep their share
+      set->addRange(k, l, l);
+      moveUnusedLine(stepwise, 0, k);
+      marked.emplace_back(l, k);
+    }
+    AdjustmentList adj;
+    adj.append(AdjustEntry(makeKgvFileRef("src/m.c", "src/m.c"), std::move(set)));
+    auto rebuilt = build(text, adj);
+    ASSERT_EQ(rebuilt->rc, allOK);
+    const SumCounts& want = onlyFile(*rebuilt->root).functions[0].counts;
+    EXPECT_EQ(stepwise.adjLines, want.adjLines);
+    EXPECT_EQ(stepwise.adjUnusedLines, want.adjUnusedLines);
+    EXPECT_EQ(stepwise.deadLines, want.deadLines);
+    EXPECT_EQ(stepwise.testedLines, want.testedLines);
+    EXPECT_EQ(stepwise.inspectedLines, want.inspectedLines);
+    for (const auto& [line, kind] : marked) moveUnusedLine(stepwise, kind, 0);
+    EXPECT_EQ(stepwise.adjLines, before.adjLines);
+    EXPECT_EQ(stepwise.adjUnusedLines, before.adjUnusedLines);
+    EXPECT_EQ(stepwise.deadLines + stepwise.testedLines + stepwise.inspectedLines, 0u);
+  }
+  // Removing more marks than were made never wraps a count below 0.
+  SumCounts empty;
+  moveUnusedLine(empty, adjLineTested, 0);
+  EXPECT_EQ(empty.testedLines, 0u);
+  EXPECT_EQ(empty.adjUnusedLines, 1u);
 }
 
 TEST(SummaryAdjusted, AFunctionOfOnlyUnusedDeadLinesIsAllDead) {

@@ -2,8 +2,8 @@
 // children, resorting, new data, and adjustment counts walking up to the overall row.
 #include <gtest/gtest.h>
 
+#include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
-#include "adjust/adjustment_list.h"
 #include "settings/resource_table.h"
 #include "summary/cell_format.h"
 #include "summary/kg_columns.h"
@@ -239,13 +239,13 @@ TEST_F(SummaryRows, DeadcodeAdjustmentsMakeAFunctionDeadAndReachTheTotals) {
   ASSERT_NE(helper, nullptr);
   const std::uint32_t unused = helper->counts().adjUnusedLines;
   ASSERT_GT(unused, 0u);
-  for (std::uint32_t i = 0; i < unused; ++i) helper->adjustment_added(kgAdjDeadcode);
+  for (std::uint32_t i = 0; i < unused; ++i) helper->adjustment_added(adjLineDead);
   for (std::uint32_t id : {11u, 13u, 16u}) EXPECT_EQ(trim(cell(v.lineOf("helper"), id)), "dead");
   EXPECT_EQ(trim(cell(v.lineOf("Total Coverage"), 16)), "1");
   EXPECT_EQ(trim(cell(v.lineOf("main.c"), 16)), "1");
   EXPECT_EQ(trim(cell(v.lineOf("Total Coverage"), 31)), std::to_string(unused));
   // Taking one back: no longer all dead, the ancestors lose the dead function.
-  helper->adjustment_removed(kgAdjDeadcode);
+  helper->adjustment_removed(adjLineDead);
   EXPECT_EQ(trim(cell(v.lineOf("helper"), 11)), "unused");
   EXPECT_EQ(trim(cell(v.lineOf("src/app/"), 16)), "0");
   EXPECT_EQ(trim(cell(v.lineOf("Total Coverage"), 31)), std::to_string(unused - 1));

@@ -1,5 +1,5 @@
 // Adjustment sets: range updates, lookups, ordered iteration and totals.
-#include "adjust/cvg_adjust_set.h"
+#include "coverage/cvg_adjust_set.h"
 
 #include <utility>
 

@@ -1,5 +1,5 @@
 // Line sets as sorted maximal runs: updates merge or split runs in place.
-#include "adjust/line_set.h"
+#include "coverage/line_set.h"
 
 #include <algorithm>
 

@@ -1,5 +1,5 @@
 // Lookup, storing and merging of per-file adjustment entries.
-#include "adjust/adjustment_list.h"
+#include "coverage/adjustment_list.h"
 
 #include <ctime>
 #include <utility>

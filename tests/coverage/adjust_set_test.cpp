@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "adjust/cvg_adjust_set.h"
+#include "coverage/cvg_adjust_set.h"
 
 namespace {
 

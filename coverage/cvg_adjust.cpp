@@ -1,5 +1,5 @@
 // Names, parsing and precedence of the adjustment kinds.
-#include "adjust/cvg_adjust.h"
+#include "coverage/cvg_adjust.h"
 
 const char* cvgAdjustName(CvgAdjust kind) {
   switch (kind) {

@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "adjust/cvg_adjust_set.h"
+#include "coverage/cvg_adjust_set.h"
 #include "coverage/kgv_file_ref.h"
 
 // A file reference whose payload is the file's adjustment set, owned here.

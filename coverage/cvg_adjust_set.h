@@ -6,8 +6,8 @@
 #include <functional>
 #include <memory>
 
-#include "adjust/cvg_adjust.h"
-#include "adjust/line_set.h"
+#include "coverage/cvg_adjust.h"
+#include "coverage/line_set.h"
 
 struct AdjustLineTotals {
   unsigned long dead = 0;

@@ -35,6 +35,15 @@ bool parseCvgAdjustName(std::string_view text, CvgAdjust& kind);
 // The first kind present in precedence order, or 0 when none is.
 CvgAdjust dominantAdjust(std::uint32_t flags);
 
+// What a single kind means; false for 0 and for anything but one of the six kinds.
+inline bool isDeadAdjustment(CvgAdjust kind) { return kind == adjLineDead || kind == adjRangeDead; }
+inline bool isTestedAdjustment(CvgAdjust kind) {
+  return kind == adjLineTested || kind == adjRangeTested;
+}
+inline bool isInspectedAdjustment(CvgAdjust kind) {
+  return kind == adjLineInspected || kind == adjRangeInspected;
+}
+
 // "DEAD", "TEST" or "INSP" for the dominant kind of the flags; empty when none.
 const char* adjustCode(std::uint32_t flags);
 
