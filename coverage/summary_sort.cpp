@@ -6,8 +6,6 @@
 #include <cstring>
 #include <functional>
 
-#include "summary/sort_orders.h"
-
 namespace {
 
 // Name by bytes, then native index, then place in memory.
@@ -129,10 +127,6 @@ SortComparison sortComparator(std::uint32_t id) {
     case 17: return withTieBreak<byBUnusedPct>;
     default: return nullptr;
   }
-}
-
-ErrorCode parseSortOrder(const char* name, std::uint32_t& id) {
-  return sort_order_by_name(name, id);
 }
 
 ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder) {

@@ -1,5 +1,5 @@
-// The seventeen orders of the summary tree: their comparisons, name lookup and the sort of
-// every level of a tree.
+// The seventeen orders of the summary tree: their comparisons and the sort of every level
+// of a tree (their names: coverage/sort_orders.h).
 #pragma once
 
 #include <cstdint>
@@ -20,9 +20,6 @@ using SortComparison = int (*)(const SortKey& a, const SortKey& b);
 
 // The comparison of an order (1..17); nullptr for 18 or any id outside the table.
 SortComparison sortComparator(std::uint32_t id);
-
-// Exact, case-sensitive lookup of the name; absent, empty or unknown: invalidSortingOrder.
-ErrorCode parseSortOrder(const char* name, std::uint32_t& id);
 
 // Sorts dirOrder, every fileOrder and every funcOrder by the order and stores it in the
 // root. Ids outside 1..17 leave the tree as it is.

@@ -10,8 +10,8 @@
 
 #include "adjust/adjustments_file.h"
 #include "coverage/adjustment_list.h"
+#include "coverage/sort_orders.h"
 #include "coverage/summary_build.h"
-#include "coverage/summary_sort.h"
 #include "settings/settings_startup.h"
 #include "startup/console_report.h"
 #include "startup/export_mode.h"
@@ -220,7 +220,7 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, ViewerRun
 ErrorCode startupSortOrder(const std::vector<ViewerOption>& options, std::uint32_t& order) {
   order = 0;
   if (const ViewerOption* o = findGivenOption("sort", options)) {
-    ErrorCode rc = parseSortOrder(o->value.c_str(), order);
+    ErrorCode rc = sort_order_by_name(o->value.c_str(), order);
     if (rc != allOK) {
       reportError(invalidSortingOrder, "Couldn't interpret %s as a sorting order.\n",
                   o->value.c_str());

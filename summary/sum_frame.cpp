@@ -8,6 +8,7 @@
 #include <algorithm>
 #include <cstdlib>
 
+#include "coverage/sort_orders.h"
 #include "outline/qr_oi_multi_text.h"
 #include "outline/qr_oi_outline_display.h"
 #include "outline/qr_oi_scroll_text.h"
@@ -17,7 +18,6 @@
 #include "summary/kg_columns.h"
 #include "summary/kg_outline_text.h"
 #include "summary/name_style.h"
-#include "summary/sort_orders.h"
 #include "summary/sum_dialogs.h"
 #include "summary/sum_timing.h"
 #include "summary/sum_toolbar.h"
@@ -184,11 +184,21 @@ void KG_SumFrame::buildFileMenu(OI_Menu* file) {
   file->addCell("kgExit", "Exit", [this] { exit_viewer(); });
 }
 
+namespace {
+
+// The cells of the sort menu "kgSort" in order; an empty name stands for a separator.
+const char* const kSortMenuCells[] = {
+    "alpha",    "native",     "",       "al_unused", "al_unused%", "al_used", "al_used%",
+    "adj_lines", "",          "l_unused", "l_unused%", "l_used",   "l_used%", "lines",
+    "",         "b_unused",   "b_unused%", "b_used",   "b_used%",  "blocks"};
+
+}  // namespace
+
 void KG_SumFrame::buildViewMenu(OI_Menu* view) {
   KG_Settings& s = kgSettings();
   sortMenu_ = view->addSubmenu("kgSortBy", "Select sorting order", "kgSort");
   sortMenu_->setRadio(true);
-  for (const char* name : sortMenuCells()) {
+  for (const char* name : kSortMenuCells) {
     if (*name == '\0') {
       sortMenu_->addSeparator();
       continue;

@@ -6,9 +6,9 @@
 #include <random>
 
 #include "adjust/export_report.h"
+#include "coverage/sort_orders.h"
 #include "coverage/summary_build.h"
 #include "coverage/summary_sort.h"
-#include "summary/sort_orders.h"
 #include "tests/coverage/kgv_test_util.h"
 
 namespace {
@@ -342,7 +342,7 @@ const char kRatios[] =
 
 std::vector<std::string> order(std::uint32_t id) {
   std::uint32_t parsed = 0;
-  EXPECT_EQ(parseSortOrder(sort_order_name(id), parsed), allOK);
+  EXPECT_EQ(sort_order_by_name(sort_order_name(id), parsed), allOK);
   auto b = build(kRatios, {}, parsed);
   EXPECT_EQ(b->rc, allOK);
   return fileNames(*b->root->dirOrder[0]);
@@ -388,19 +388,24 @@ TEST(SummarySort, FunctionsOfEqualNameAndCountsGoByTheirPlaceInTheMap) {
   EXPECT_EQ(f.funcOrder[2], &f.functions[2]);
 }
 
-TEST(SummarySort, NamesAndComparatorsOfTheTable) {
+TEST(SummarySort, NamesIdsAndLabels) {
   std::uint32_t id = 0;
-  EXPECT_EQ(parseSortOrder("l_unused%", id), allOK);
-  EXPECT_EQ(id, 7u);
-  EXPECT_EQ(parseSortOrder("Alpha", id), invalidSortingOrder);
-  EXPECT_EQ(parseSortOrder("", id), invalidSortingOrder);
-  EXPECT_EQ(parseSortOrder(nullptr, id), invalidSortingOrder);
-  for (std::uint32_t i = 1; i <= 17; ++i) EXPECT_NE(sortComparator(i), nullptr) << i;
-  EXPECT_EQ(sortComparator(0), nullptr);
-  EXPECT_EQ(sortComparator(18), nullptr);
-  SumCounts c;
-  SortKey k{"x", 1, &c, &c};
-  EXPECT_EQ(sortComparator(3)(k, k), 0);
+  EXPECT_EQ(sort_order_by_name("l_used%", id), allOK);
+  EXPECT_EQ(id, 5u);
+  EXPECT_STREQ(sort_order_name(5), "l_used%");
+  EXPECT_STREQ(sort_order_label(12), "Adjusted percent of lines unused");
+  EXPECT_EQ(sort_order_by_name("Alpha", id), invalidSortingOrder);
+  EXPECT_EQ(id, 11u);
+  EXPECT_EQ(sort_order_by_name("", id), invalidSortingOrder);
+  EXPECT_EQ(sort_order_by_name(nullptr, id), invalidSortingOrder);
+  EXPECT_STREQ(sort_order_name(18), "");
+  for (std::uint32_t i = 1; i <= 17; ++i) {
+    ASSERT_EQ(sort_order_by_name(sort_order_name(i), id), allOK);
+    EXPECT_EQ(id, i);
+  }
+  ASSERT_EQ(sortOrderNameTable().size(), 18u);
+  EXPECT_STREQ(sortOrderNameTable()[4].name, "l_unused");
+  EXPECT_STREQ(sortOrderNameTable()[17].name, "");
 }
 
 TEST(SummaryViewState, ARebuildKeepsTheStateOfRowsThatStillExist) {

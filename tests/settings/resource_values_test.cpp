@@ -4,9 +4,9 @@
 #include <cstring>
 #include <set>
 
+#include "coverage/sort_orders.h"
 #include "settings/resource_converters.h"
 #include "settings/resource_table.h"
-#include "summary/sort_orders.h"
 #include "settings_test_util.h"
 
 using kgtest::settingsFrom;

@@ -1,31 +1,7 @@
-// Sort order names, name shortening, function display names and the name column width.
+// Name shortening, function display names and the name column width.
 #include <gtest/gtest.h>
 
 #include "summary/name_style.h"
-#include "summary/sort_orders.h"
-
-TEST(SortOrders, NamesIdsAndLabels) {
-  std::uint32_t id = 0;
-  EXPECT_EQ(sort_order_by_name("l_used%", id), allOK);
-  EXPECT_EQ(id, 5u);
-  EXPECT_STREQ(sort_order_name(5), "l_used%");
-  EXPECT_STREQ(sort_order_label(12), "Adjusted percent of lines unused");
-  EXPECT_EQ(sort_order_by_name("Alpha", id), invalidSortingOrder);
-  EXPECT_EQ(id, 11u);
-  EXPECT_EQ(sort_order_by_name("", id), invalidSortingOrder);
-  EXPECT_EQ(sort_order_by_name(nullptr, id), invalidSortingOrder);
-  EXPECT_STREQ(sort_order_name(18), "");
-  for (std::uint32_t i = 1; i <= 17; ++i) {
-    ASSERT_EQ(sort_order_by_name(sort_order_name(i), id), allOK);
-    EXPECT_EQ(id, i);
-  }
-  ASSERT_EQ(sortOrderNameTable().size(), 18u);
-  EXPECT_STREQ(sortOrderNameTable()[4].name, "l_unused");
-  EXPECT_STREQ(sortOrderNameTable()[17].name, "");
-  size_t named = 0;
-  for (const char* c : sortMenuCells()) named += *c != '\0';
-  EXPECT_EQ(named, 17u);
-}
 
 TEST(NameShortening, TextsAndPaths) {
   EXPECT_EQ(shorten_leftmost("abcdefghij", 6), "abc...");

@@ -3,12 +3,12 @@
 #include <gtest/gtest.h>
 
 #include "coverage/adjustment_list.h"
+#include "coverage/sort_orders.h"
 #include "coverage/summary_build.h"
 #include "settings/resource_table.h"
 #include "summary/cell_format.h"
 #include "summary/kg_columns.h"
 #include "summary/kg_outline_text.h"
-#include "summary/sort_orders.h"
 #include "tests/coverage/kgv_test_util.h"
 #include "tests/outline/recording_display.h"
 

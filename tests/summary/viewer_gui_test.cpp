@@ -6,7 +6,7 @@
 
 #include <fstream>
 
-#include "summary/sort_orders.h"
+#include "coverage/sort_orders.h"
 #include "tests/toolkit/gui_driver.h"
 #include "tools/kgv_maker.h"
 

@@ -1,5 +1,5 @@
 // Sort order names and labels.
-#include "summary/sort_orders.h"
+#include "coverage/sort_orders.h"
 
 #include <cstring>
 
@@ -56,12 +56,4 @@ ErrorCode sort_order_by_name(const char* name, std::uint32_t& id) {
   }
   id = kDefaultSortOrder;
   return invalidSortingOrder;
-}
-
-const std::vector<const char*>& sortMenuCells() {
-  static const std::vector<const char*> cells = {
-      "alpha",    "native",     "",       "al_unused", "al_unused%", "al_used", "al_used%",
-      "adj_lines", "",          "l_unused", "l_unused%", "l_used",   "l_used%", "lines",
-      "",         "b_unused",   "b_unused%", "b_used",   "b_used%",  "blocks"};
-  return cells;
 }

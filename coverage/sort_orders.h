@@ -1,4 +1,4 @@
-// The seventeen sort orders: ids, names, menu labels, and the sort menu's cells.
+// The seventeen sort orders: ids, the names options and settings use, and their labels.
 #pragma once
 
 #include <cstdint>
@@ -25,6 +25,3 @@ const char* sort_order_name(std::uint32_t id);
 const char* sort_order_label(std::uint32_t id);
 // Exact, case-sensitive name; empty or unknown: invalidSortingOrder with id 11.
 ErrorCode sort_order_by_name(const char* name, std::uint32_t& id);
-
-// The cells of the sort menu "kgSort" in order; an empty name stands for a separator.
-const std::vector<const char*>& sortMenuCells();
