@@ -217,14 +217,14 @@ void writeFunction(GuardedWriter& w, const SumFile& file, const std::vector<Line
 
 }  // namespace
 
-ErrorCode writeExport(FILE* stream, const SumRoot& root) {
-  return writeExport(stream, root, std::time(nullptr));
+ErrorCode writeExport(FILE* stream, const SumRoot& root, MessageSink& messages) {
+  return writeExport(stream, root, std::time(nullptr), messages);
 }
 
 namespace {
 
-ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when) {
-  LazyLineStates lineStates(adjustmentList(), root.hitsPolicy);
+ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when, MessageSink& messages) {
+  LazyLineStates lineStates(adjustmentList(), root.hitsPolicy, messages);
   GuardedWriter w(stream);
   writeHeader(w, when);
   const SumCounts& t = root.counts;
@@ -257,10 +257,10 @@ ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when) {
 
 }  // namespace
 
-ErrorCode writeExport(FILE* stream, const SumRoot& root, std::time_t when) {
+ErrorCode writeExport(FILE* stream, const SumRoot& root, std::time_t when, MessageSink& messages) {
   clearPendingSystemError();
   try {
-    return writeReport(stream, root, when);
+    return writeReport(stream, root, when, messages);
   } catch (const std::bad_alloc&) {
     return outOfMemory;
   } catch (...) {
@@ -268,11 +268,11 @@ ErrorCode writeExport(FILE* stream, const SumRoot& root, std::time_t when) {
   }
 }
 
-ErrorCode exportToFile(const SumRoot& root, const std::string& path) {
+ErrorCode exportToFile(const SumRoot& root, const std::string& path, MessageSink& messages) {
   AtomicFileWriter out;
   ErrorCode rc = out.open(path);
   if (rc != allOK) return writeError;
-  rc = writeExport(out.stream(), root);
+  rc = writeExport(out.stream(), root, messages);
   if (rc != allOK) {
     out.abandon();
     return rc;

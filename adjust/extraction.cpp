@@ -45,7 +45,8 @@ std::string manyFilesMessage(const std::string& format, unsigned long files,
 
 namespace {
 
-ExtractionOutcome extract(SumRoot& root, const std::string& skipPath, ExtractionQuestion& question) {
+ExtractionOutcome extract(SumRoot& root, const std::string& skipPath, ExtractionQuestion& question,
+                          MessageSink& messages) {
   ExtractionOutcome outcome;
   AdjustSettings settings = adjustSettings();
   unsigned long files = root.files;
@@ -109,16 +110,16 @@ ExtractionOutcome extract(SumRoot& root, const std::string& skipPath, Extraction
   AdjustmentList& list = adjustmentList();
   list = AdjustmentList::merge(std::move(list), std::move(fresh));
   outcome.writeStatus = writeAdjustmentsFile();
-  outcome.recomputeStatus = recomputeSummary(root, root.hitsPolicy, list);
+  outcome.recomputeStatus = recomputeSummary(root, root.hitsPolicy, list, messages);
   return outcome;
 }
 
 }  // namespace
 
 ExtractionOutcome extractAllAdjustments(SumRoot& root, const std::string& skipPath,
-                                        ExtractionQuestion& question) {
+                                        ExtractionQuestion& question, MessageSink& messages) {
   try {
-    return extract(root, skipPath, question);
+    return extract(root, skipPath, question, messages);
   } catch (const std::bad_alloc&) {
     ExtractionOutcome failed;
     failed.performed = true;

@@ -8,6 +8,7 @@
 
 #include "coverage/summary_types.h"
 #include "support/errors.h"
+#include "support/message_sink.h"
 
 // The question asked before a long extraction. The console goes on without asking.
 class ExtractionQuestion {
@@ -36,6 +37,6 @@ std::string manyFilesMessage(const std::string& format, unsigned long files,
 
 // Runs the extraction over the summary's files in record order, skipping `skipPath` (the
 // file of an open annotated source window; empty for none), with the process-wide
-// adjustment list and the summary's hits policy.
+// adjustment list and the summary's hits policy. Notices of the recount go to `messages`.
 ExtractionOutcome extractAllAdjustments(SumRoot& root, const std::string& skipPath,
-                                        ExtractionQuestion& question);
+                                        ExtractionQuestion& question, MessageSink& messages);

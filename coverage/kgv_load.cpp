@@ -48,9 +48,9 @@ class MergeWhileReading : public KgvRecordVisitor {
     return mixed_ ? allOK : merger_.add(mode_, r, ignored_);
   }
   // After a complete read: 1, or 36 when data were set aside.
-  ErrorCode finish(bool intoIsJava) {
+  ErrorCode finish() {
     if (mixed_) {
-      KgvMerger::warnMixedLanguages(intoIsJava);
+      merger_.warnMixedLanguages();
       return mergeIgnored;
     }
     return merger_.finish(mode_, header_, false);
@@ -74,8 +74,8 @@ ErrorCode loadKgvFile(KgvFileRef& ref, std::unique_ptr<KgvData>& out) {
 }
 
 ErrorCode loadAllKgvFiles(std::vector<KgvFileRef>& files, std::uint32_t mergeMode,
-                          std::vector<std::string>* ignored, std::unique_ptr<KgvData>& out,
-                          std::size_t& fileCountOrFailedIndex) {
+                          std::vector<std::string>* ignored, MessageSink& messages,
+                          std::unique_ptr<KgvData>& out, std::size_t& fileCountOrFailedIndex) {
   out.reset();
   fileCountOrFailedIndex = 0;
   if (files.empty()) return noFileName;
@@ -92,7 +92,7 @@ ErrorCode loadAllKgvFiles(std::vector<KgvFileRef>& files, std::uint32_t mergeMod
       if (rc == allOK) {
         setKgvIsJava(acc->header.isJava != 0);
         try {
-          merger = std::make_unique<KgvMerger>(*acc);
+          merger = std::make_unique<KgvMerger>(*acc, messages);
         } catch (const std::bad_alloc&) {
           rc = outOfMemory;
         }
@@ -100,7 +100,7 @@ ErrorCode loadAllKgvFiles(std::vector<KgvFileRef>& files, std::uint32_t mergeMod
     } else {
       MergeWhileReading visitor(*merger, mergeMode, ignored);
       rc = underLock(files[i], [&] { return readKgvRecords(files[i].givenName, &buffer, visitor); });
-      if (rc == allOK) rc = visitor.finish(acc->header.isJava != 0);
+      if (rc == allOK) rc = visitor.finish();
       if (rc == mergeIgnored) {
         anyIgnored = true;
         rc = allOK;

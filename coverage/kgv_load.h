@@ -9,6 +9,7 @@
 #include "coverage/kgv_data.h"
 #include "coverage/kgv_file_ref.h"
 #include "support/errors.h"
+#include "support/message_sink.h"
 
 // Locks the file named by the reference's given name, reads it, unlocks it; on success the
 // reference's loadTime becomes the current time.
@@ -17,10 +18,10 @@ ErrorCode loadKgvFile(KgvFileRef& ref, std::unique_ptr<KgvData>& out);
 // Loads and merges every file in order. 1, 36 when data were set aside, else the first
 // failure's code with failedIndex set to the failing file (0-based); 9 for an empty list.
 // The first file's isJava becomes the process-wide isJava. On success fileCount is the
-// number of files.
+// number of files. Warnings about data set aside go to `messages`.
 ErrorCode loadAllKgvFiles(std::vector<KgvFileRef>& files, std::uint32_t mergeMode,
-                          std::vector<std::string>* ignored, std::unique_ptr<KgvData>& out,
-                          std::size_t& fileCountOrFailedIndex);
+                          std::vector<std::string>* ignored, MessageSink& messages,
+                          std::unique_ptr<KgvData>& out, std::size_t& fileCountOrFailedIndex);
 
 // The isJava field of the first file of the last load of all files.
 bool kgvIsJava();

@@ -5,7 +5,6 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstdio>
 #include <ctime>
 #include <vector>
 
@@ -35,8 +34,6 @@ LockSettings& settings() {
   static LockSettings s;
   return s;
 }
-
-unsigned g_consoleWaits = 0;
 
 LockSettings::Held* heldLock(const struct stat& st) {
   for (auto& h : settings().held)
@@ -178,22 +175,3 @@ int lockBreakAge() { return settings().breakAge; }
 void setLockingEnabled(bool enabled) { settings().enabled = enabled; }
 bool lockingEnabled() { return settings().enabled; }
 void setLockSleeper(std::function<void()> sleeper) { settings().sleeper = std::move(sleeper); }
-
-bool consoleLockReporter(int event, const std::string& path, const std::string& lockName) {
-  if (event == LockEventWait) {
-    if (++g_consoleWaits % 5 != 0) return true;
-    fflush(stdout);
-    fprintf(stderr, "Kestrelgauge: Waiting for lock on %s\n", path.c_str());
-    fprintf(stderr, "Kestrelgauge: (Will break lock if it gets older than %d seconds.)\n",
-            lockBreakAge());
-    fprintf(stderr, "Kestrelgauge: (lock name: %s)\n", lockName.c_str());
-  } else if (event == LockEventBreak) {
-    fflush(stdout);
-    fprintf(stderr, "Kestrelgauge: Breaking old lock on %s\n", path.c_str());
-    fprintf(stderr, "Kestrelgauge: (lock name: %s)\n", lockName.c_str());
-  }
-  fflush(stderr);
-  return true;
-}
-
-void resetConsoleLockReporter() { g_consoleWaits = 0; }

@@ -36,10 +36,5 @@ bool lockingEnabled();
 // The lock directory of a data file path; empty (with the code) when none can be formed.
 ErrorCode kgvLockName(const std::string& path, std::string& lockName);
 
-// The console reporter of start-up: the waiting lines on every fifth wait, the breaking
-// lines, always continues.
-bool consoleLockReporter(int event, const std::string& path, const std::string& lockName);
-void resetConsoleLockReporter();  // the count of waits starts again (for a new run)
-
 // How a waiting lock passes a second; replaceable so that callers can be told of the wait.
 void setLockSleeper(std::function<void()> sleeper);

@@ -2,7 +2,6 @@
 #include "coverage/kgv_merge.h"
 
 #include <algorithm>
-#include <cstdio>
 #include <cstring>
 #include <ctime>
 #include <new>
@@ -273,7 +272,7 @@ std::unique_ptr<ObjRecord> structuralMergeRecords(const ObjRecord& x, const ObjR
   return out;
 }
 
-KgvMerger::KgvMerger(KgvData& into) : a_(into) {
+KgvMerger::KgvMerger(KgvData& into, MessageSink& messages) : a_(into), messages_(messages) {
   index_.reserve(into.records.size() * 2);
   for (size_t i = 0; i < into.records.size(); ++i)
     index_.emplace(into.records[i]->fileNameView(), i);  // the first of a name stays
@@ -350,12 +349,10 @@ void KgvMerger::mergeOne(std::uint32_t mode, Source& src, std::vector<std::strin
   }
 }
 
-void KgvMerger::warnMixedLanguages(bool intoIsJava) {
-  fflush(stdout);
-  fputs(intoIsJava ? "Warn: Found C/C++ .kgv files when processing Java .kgv files.\n"
-                   : "Warn: Found Java .kgv files when processing C/C++ .kgv files.\n",
-        stderr);
-  fflush(stderr);
+void KgvMerger::warnMixedLanguages() {
+  messages_.warning(a_.header.isJava != 0
+                        ? "Warn: Found C/C++ .kgv files when processing Java .kgv files.\n"
+                        : "Warn: Found Java .kgv files when processing C/C++ .kgv files.\n");
 }
 
 bool KgvMerger::begin(const KgvHeader& b) {
@@ -395,7 +392,7 @@ ErrorCode KgvMerger::finish(std::uint32_t mode, const KgvHeader& b, bool rebuild
 ErrorCode KgvMerger::merge(std::uint32_t mode, KgvData& b, std::vector<std::string>* ignored,
                            bool consume, bool rebuildSizes) {
   if (!begin(b.header)) {
-    warnMixedLanguages(a_.header.isJava != 0);
+    warnMixedLanguages();
     return mergeIgnored;
   }
   ErrorCode rc = allOK;
@@ -412,9 +409,9 @@ ErrorCode KgvMerger::merge(std::uint32_t mode, KgvData& b, std::vector<std::stri
 }
 
 ErrorCode mergeKgvData(std::uint32_t mode, KgvData& a, KgvData& b,
-                       std::vector<std::string>* ignored) {
+                       std::vector<std::string>* ignored, MessageSink& messages) {
   try {
-    KgvMerger merger(a);
+    KgvMerger merger(a, messages);
     return merger.merge(mode, b, ignored, false, true);
   } catch (const std::bad_alloc&) {
     return outOfMemory;
@@ -422,11 +419,12 @@ ErrorCode mergeKgvData(std::uint32_t mode, KgvData& a, KgvData& b,
 }
 
 ErrorCode mergeKgvDataCopy(std::uint32_t mode, const KgvData& a, KgvData& b,
-                           std::vector<std::string>* ignored, std::unique_ptr<KgvData>& out) {
+                           std::vector<std::string>* ignored, MessageSink& messages,
+                           std::unique_ptr<KgvData>& out) {
   out.reset();
   try {
     std::unique_ptr<KgvData> copy = copyKgvData(a);
-    ErrorCode rc = mergeKgvData(mode, *copy, b, ignored);
+    ErrorCode rc = mergeKgvData(mode, *copy, b, ignored, messages);
     if (rc == allOK || rc == mergeIgnored) out = std::move(copy);
     return rc;
   } catch (const std::bad_alloc&) {

@@ -10,17 +10,20 @@
 
 #include "coverage/kgv_data.h"
 #include "support/errors.h"
+#include "support/message_sink.h"
 
 constexpr std::uint32_t kMergeNewestWins = 1;
 constexpr std::uint32_t kMergeForce = 2;
 
 // Merges B into A in place; of B only counts at block-line positions may be filled in.
-// 1, 36 (some data set aside: an older version, or Java and C/C++ data mixed) or 12.
+// 1, 36 (some data set aside: an older version, or Java and C/C++ data mixed) or 12. The
+// source files of older versions set aside go to `ignored`; mixed languages are a warning.
 ErrorCode mergeKgvData(std::uint32_t mode, KgvData& a, KgvData& b,
-                       std::vector<std::string>* ignored);
+                       std::vector<std::string>* ignored, MessageSink& messages);
 // A deep copy of A with B merged into it; A is unchanged. No data on a code other than 1/36.
 ErrorCode mergeKgvDataCopy(std::uint32_t mode, const KgvData& a, KgvData& b,
-                           std::vector<std::string>* ignored, std::unique_ptr<KgvData>& out);
+                           std::vector<std::string>* ignored, MessageSink& messages,
+                           std::unique_ptr<KgvData>& out);
 
 // Count merge of two records of one version: X changes, R not.
 void countMergeRecords(ObjRecord& x, const ObjRecord& r, bool hitFlagsOnly);
@@ -37,7 +40,8 @@ struct KgvRecordBytes;
 // are found by file name through a hash index (the first record of a name wins).
 class KgvMerger {
  public:
-  explicit KgvMerger(KgvData& into);
+  // Warnings about data set aside go to `messages`.
+  KgvMerger(KgvData& into, MessageSink& messages);
   // One body merged in. With consume, B's records are moved instead of copied (B is
   // spent). With rebuildSizes false the caller rebuilds recordSizes when done.
   ErrorCode merge(std::uint32_t mode, KgvData& b, std::vector<std::string>* ignored, bool consume,
@@ -49,7 +53,8 @@ class KgvMerger {
   bool begin(const KgvHeader& b);
   ErrorCode add(std::uint32_t mode, const KgvRecordBytes& record, std::vector<std::string>* ignored);
   ErrorCode finish(std::uint32_t mode, const KgvHeader& b, bool rebuildSizes);
-  static void warnMixedLanguages(bool intoIsJava);
+  // The warning that a file of the other language was set aside.
+  void warnMixedLanguages();
 
   bool mergedAny() const { return mergedAny_; }
 
@@ -58,6 +63,7 @@ class KgvMerger {
   void mergeOne(std::uint32_t mode, Source& src, std::vector<std::string>* ignored);
   void replace(size_t at, std::unique_ptr<ObjRecord> record);
   KgvData& a_;
+  MessageSink& messages_;
   std::unordered_map<std::string_view, size_t> index_;
   bool mergedAny_ = false;
   bool hitFlags_ = false;

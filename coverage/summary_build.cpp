@@ -3,7 +3,6 @@
 #include "coverage/summary_build.h"
 
 #include <algorithm>
-#include <cstdio>
 #include <cstdlib>
 #include <new>
 #include <string_view>
@@ -253,8 +252,9 @@ void classifyLines(std::vector<LineState>& states) {
   }
 }
 
+// Damaged line numbers are noted through `messages` when they are to be reported.
 void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
-                     bool checkCorrupted, std::vector<LineState>& states) {
+                     MessageSink& messages, std::vector<LineState>& states) {
   states.assign(f.lineCount, LineState{});
   if (f.lineCount == 0) return;
   const std::vector<std::uint32_t>& map = f.record->map;
@@ -272,15 +272,13 @@ void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet*
     } else if (tag == TagBlock || tag == TagBlockLine) {
       if (tag == TagBlock) blockCount = i < counts.size() ? counts[i] : 0;
       if (v > f.lineCount) {
-        // Lines past the end of the file's lines are never stored; with the variable set
-        // the first one of the file is reported.
-        if (checkCorrupted && !reported) {
+        // Lines past the end of the file's lines are never stored; when asked for, the first
+        // one of the file is reported.
+        if (!reported && corruptedLinesReported()) {
           reported = true;
-          fflush(stderr);
-          printf("The line number information of file %s is corrupted.\n"
-                 "Kestrel will not process this information\n",
-                 f.record->fileName());
-          fflush(stdout);
+          messages.notice(stringPrintf("The line number information of file %s is corrupted.\n"
+                                       "Kestrel will not process this information\n",
+                                       f.record->fileName()));
         }
         continue;
       }
@@ -309,12 +307,11 @@ void addTimes(std::uint32_t& first, std::uint32_t& last, std::uint32_t f, std::u
 }
 
 ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustIndex& index,
-                            bool withLineStates) {
+                            MessageSink& messages, bool withLineStates) {
   root.counts = SumCounts{};
   root.funcs = root.unusedFuncs = root.deadFuncs = root.files = 0;
   root.firstTime = 0x7FFFFFFF;
   root.lastTime = 0;
-  bool checkCorrupted = std::getenv("PROCESS_CORRUPTED_LINES") != nullptr;
   for (SumDir& d : root.dirRecords) {
     d.counts = SumCounts{};
     d.funcs = d.unusedFuncs = d.deadFuncs = 0;
@@ -340,7 +337,7 @@ ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustInd
   for (SumDir& d : root.dirRecords) {
     for (SumFile& f : d.fileRecords) {
       if (withLineStates) {
-        buildLineStates(f, policy, index.find(d, f), checkCorrupted, f.lineStates);
+        buildLineStates(f, policy, index.find(d, f), messages, f.lineStates);
       } else {
         f.lineStates.clear();
         f.lineStates.shrink_to_fit();
@@ -394,6 +391,11 @@ std::uint32_t hitsPolicyFromText(const char* value) {
   return hitsMax;
 }
 
+bool corruptedLinesReported() {
+  static const bool reported = std::getenv("PROCESS_CORRUPTED_LINES") != nullptr;
+  return reported;
+}
+
 std::uint32_t getHitsPolicy() {
   static const std::uint32_t policy = hitsPolicyFromText(std::getenv("KESTREL_HITS_POLICY"));
   return policy;
@@ -402,8 +404,8 @@ std::uint32_t getHitsPolicy() {
 namespace {
 
 ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
-                    const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out,
-                    bool withLineStates) {
+                    const AdjustmentList& adjustments, MessageSink& messages,
+                    std::unique_ptr<SumRoot>& out, bool withLineStates) {
   auto root = std::make_unique<SumRoot>();
   root->hitsPolicy = hitsPolicy;
 
@@ -485,7 +487,7 @@ ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPo
     }
   }
 
-  rc = computeStatistics(*root, hitsPolicy, AdjustIndex(adjustments), withLineStates);
+  rc = computeStatistics(*root, hitsPolicy, AdjustIndex(adjustments), messages, withLineStates);
   if (rc != allOK) return rc;
   sortSummary(*root, sortOrder);
   out = std::move(root);
@@ -495,11 +497,11 @@ ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPo
 }  // namespace
 
 ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
-                       const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out,
-                       bool withLineStates) {
+                       const AdjustmentList& adjustments, MessageSink& messages,
+                       std::unique_ptr<SumRoot>& out, bool withLineStates) {
   out.reset();
   try {
-    return buildTree(data, sortOrder, hitsPolicy, adjustments, out, withLineStates);
+    return buildTree(data, sortOrder, hitsPolicy, adjustments, messages, out, withLineStates);
   } catch (const std::bad_alloc&) {
     out.reset();
     return outOfMemory;
@@ -510,10 +512,10 @@ ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hit
 }
 
 ErrorCode recomputeSummary(SumRoot& root, std::uint32_t hitsPolicy,
-                           const AdjustmentList& adjustments) {
+                           const AdjustmentList& adjustments, MessageSink& messages) {
   root.hitsPolicy = hitsPolicy;
   try {
-    return computeStatistics(root, hitsPolicy, AdjustIndex(adjustments), true);
+    return computeStatistics(root, hitsPolicy, AdjustIndex(adjustments), messages, true);
   } catch (const std::bad_alloc&) {
     return outOfMemory;
   } catch (...) {
@@ -588,15 +590,15 @@ struct LazyLineStates::Index {
   AdjustIndex sets;
 };
 
-LazyLineStates::LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy)
-    : index_(std::make_unique<Index>(adjustments)), policy_(hitsPolicy),
-      checkCorrupted_(std::getenv("PROCESS_CORRUPTED_LINES") != nullptr) {}
+LazyLineStates::LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy,
+                               MessageSink& messages)
+    : index_(std::make_unique<Index>(adjustments)), policy_(hitsPolicy), messages_(messages) {}
 
 LazyLineStates::~LazyLineStates() = default;
 
 const std::vector<LineState>& LazyLineStates::of(const SumFile& file) {
   if (file.lineCount == 0 || !file.lineStates.empty() || !file.dir || !file.record)
     return file.lineStates;
-  buildLineStates(file, policy_, index_->sets.find(*file.dir, file), checkCorrupted_, scratch_);
+  buildLineStates(file, policy_, index_->sets.find(*file.dir, file), messages_, scratch_);
   return scratch_;
 }

@@ -12,6 +12,7 @@
 #include "coverage/kgv_data.h"
 #include "coverage/summary_types.h"
 #include "support/errors.h"
+#include "support/message_sink.h"
 
 // How the hits of several blocks on one line combine into the line's count.
 enum HitsPolicy : std::uint32_t { hitsMax = 1, hitsMin = 2, hitsFirst = 3, hitsLast = 4 };
@@ -25,17 +26,22 @@ std::uint32_t getHitsPolicy();
 // The same rule over a given value (nullptr: unset); for tests and the first call.
 std::uint32_t hitsPolicyFromText(const char* value);
 
+// PROCESS_CORRUPTED_LINES, read once: whether block lines past the last line of a file's
+// functions are reported (the first of each file, as a notice) while line states are made.
+bool corruptedLinesReported();
+
 // Builds the whole tree and sorts it. The data's maps may be reordered in place where a
 // function's blocks are out of line order. On failure nothing is handed back. Without line
 // states (a report that reads each file once) they are made per file by LazyLineStates.
+// Notices about damaged line numbers go to `messages`.
 ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
-                       const AdjustmentList& adjustments, std::unique_ptr<SumRoot>& out,
-                       bool withLineStates = true);
+                       const AdjustmentList& adjustments, MessageSink& messages,
+                       std::unique_ptr<SumRoot>& out, bool withLineStates = true);
 
 // Counts and line states again over an existing tree (after the adjustments changed); the
 // records, names and order stay.
 ErrorCode recomputeSummary(SumRoot& root, std::uint32_t hitsPolicy,
-                           const AdjustmentList& adjustments);
+                           const AdjustmentList& adjustments, MessageSink& messages);
 
 void setViewState(SumRoot& root, std::uint32_t value);
 // Each row of the new tree takes the state of the old row of the same name (by level);
@@ -50,7 +56,8 @@ SumFile* findSumFile(SumRoot& root, const std::string& path);
 // adjustment list must not change while this lives.
 class LazyLineStates {
  public:
-  LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy);
+  LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy,
+                 MessageSink& messages);
   ~LazyLineStates();
   LazyLineStates(const LazyLineStates&) = delete;
   LazyLineStates& operator=(const LazyLineStates&) = delete;
@@ -61,6 +68,6 @@ class LazyLineStates {
   struct Index;
   std::unique_ptr<Index> index_;
   std::uint32_t policy_;
-  bool checkCorrupted_;
+  MessageSink& messages_;
   std::vector<LineState> scratch_;
 };

@@ -10,6 +10,7 @@
 
 #include "coverage/kgv_file.h"
 #include "coverage/kgv_merge.h"
+#include "support/message_sink.h"
 #include "tools/kgv_maker.h"
 
 namespace {
@@ -82,8 +83,9 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   for (auto& r : other->records) r->objHeader.signature ^= 0x5A5A5A5A;
   std::unique_ptr<KgvData> merged;
   std::vector<std::string> ignored;
-  mergeKgvDataCopy(kMergeNewestWins, *d, *same, &ignored, merged);
-  mergeKgvDataCopy(kMergeForce, *d, *other, &ignored, merged);
+  MessageList messages;
+  mergeKgvDataCopy(kMergeNewestWins, *d, *same, &ignored, messages, merged);
+  mergeKgvDataCopy(kMergeForce, *d, *other, &ignored, messages, merged);
   // What was read writes back and reads again with the same records. Writing syncs the
   // disk, so only every sixteenth good input takes this path.
   static unsigned goodInputs = 0;

@@ -5,6 +5,8 @@
 #include <cstdio>
 #include <cstdlib>
 
+#include "coverage/kgv_lock.h"
+
 void reportError(ErrorCode, const char* fmt, ...) {
   fflush(stdout);
   fputs("Kestrelgauge: ", stderr);
@@ -49,3 +51,26 @@ void exitWithCode(ErrorCode code) {
   fflush(stderr);
   exit(exitStatusFor(code));
 }
+
+namespace {
+unsigned gConsoleWaits = 0;
+}  // namespace
+
+bool consoleLockReporter(int event, const std::string& path, const std::string& lockName) {
+  if (event == LockEventWait) {
+    if (++gConsoleWaits % 5 != 0) return true;
+    fflush(stdout);
+    fprintf(stderr, "Kestrelgauge: Waiting for lock on %s\n", path.c_str());
+    fprintf(stderr, "Kestrelgauge: (Will break lock if it gets older than %d seconds.)\n",
+            lockBreakAge());
+    fprintf(stderr, "Kestrelgauge: (lock name: %s)\n", lockName.c_str());
+  } else if (event == LockEventBreak) {
+    fflush(stdout);
+    fprintf(stderr, "Kestrelgauge: Breaking old lock on %s\n", path.c_str());
+    fprintf(stderr, "Kestrelgauge: (lock name: %s)\n", lockName.c_str());
+  }
+  fflush(stderr);
+  return true;
+}
+
+void resetConsoleLockReporter() { gConsoleWaits = 0; }

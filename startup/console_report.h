@@ -2,6 +2,8 @@
 // and the exit with the status of a result code.
 #pragma once
 
+#include <string>
+
 #include "support/errors.h"
 
 // Console report: "Kestrelgauge: " + text, a newline if missing, then an empty line.
@@ -16,3 +18,8 @@ extern const char* const kUsageErrorText;
 int exitStatusFor(ErrorCode code);
 // Flushes the standard streams and ends the process with the status of the code.
 [[noreturn]] void exitWithCode(ErrorCode code);
+
+// The lock-wait reporter of the console modes: the waiting lines on every fifth wait, the
+// breaking lines; always goes on waiting.
+bool consoleLockReporter(int event, const std::string& path, const std::string& lockName);
+void resetConsoleLockReporter();  // the count of waits starts again (for a new run)

@@ -6,11 +6,13 @@
 #include "adjust/export_report.h"
 #include "startup/console_report.h"
 #include "startup/merge_mode.h"
+#include "support/message_sink.h"
 
 ErrorCode runExportMode(StartupSummary& prepared) {
   if (prepared.loadStatus == mergeIgnored) reportOutOfDate(prepared.ignored);
   reportAdjustmentProblems(prepared.adjustmentProblems);
-  ErrorCode rc = writeExport(stdout, *prepared.summary);
+  ConsoleMessages console;
+  ErrorCode rc = writeExport(stdout, *prepared.summary, console);
   if (rc != allOK) {
     reportError(rc, "Couldn't export\n%s\n", errorMessage(rc).c_str());
     return rc;

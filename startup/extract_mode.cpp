@@ -8,12 +8,14 @@
 #include "adjust/extraction.h"
 #include "startup/console_report.h"
 #include "startup/merge_mode.h"
+#include "support/message_sink.h"
 
 ErrorCode runExtractMode(StartupSummary& prepared) {
   if (prepared.loadStatus == mergeIgnored) reportOutOfDate(prepared.ignored);
   reportAdjustmentProblems(prepared.adjustmentProblems);
   AlwaysContinue goOn;
-  ExtractionOutcome outcome = extractAllAdjustments(*prepared.summary, "", goOn);
+  ConsoleMessages console;
+  ExtractionOutcome outcome = extractAllAdjustments(*prepared.summary, "", goOn, console);
   for (const std::string& line : outcome.lines) {
     fputs(line.c_str(), stdout);
     fputc('\n', stdout);

@@ -6,6 +6,7 @@
 #include "coverage/kgv_load.h"
 #include "coverage/kgv_lock.h"
 #include "startup/console_report.h"
+#include "support/message_sink.h"
 
 ErrorCode loadStartupFiles(StartupState& s, std::unique_ptr<KgvData>& data,
                            std::vector<std::string>& ignored) {
@@ -16,7 +17,8 @@ ErrorCode loadStartupFiles(StartupState& s, std::unique_ptr<KgvData>& data,
   setLockingEnabled(s.lockingEnabled);
 
   size_t index = 0;
-  ErrorCode rc = loadAllKgvFiles(s.loadedFiles, s.mergeMode, &ignored, data, index);
+  ConsoleMessages console;
+  ErrorCode rc = loadAllKgvFiles(s.loadedFiles, s.mergeMode, &ignored, console, data, index);
   if (rc != allOK && rc != mergeIgnored) {
     std::string name = index < s.loadedFiles.size() ? s.loadedFiles[index].givenName : "";
     reportError(rc, "Can't load file %s.\n%s\n", name.c_str(), errorMessage(rc).c_str());

@@ -20,6 +20,7 @@
 #include "startup/merge_mode.h"
 #include "startup/settings_wiring.h"
 #include "support/diagnostic.h"
+#include "support/message_sink.h"
 #include "support/runtime_options.h"
 
 StartupState& startupState() {
@@ -279,9 +280,9 @@ ErrorCode prepareStartupSummary(StartupState& s, StartupSummary& out) {
   // 15. The summary.
   // The report alone reads each file's line states once: they are made as it goes, except
   // when damaged line numbers are to be reported before anything else.
-  bool lineStatesLater =
-      s.mode == RunMode::exportReport && std::getenv("PROCESS_CORRUPTED_LINES") == nullptr;
-  rc = buildSummary(*out.data, out.sortOrder, out.hitsPolicy, adjustmentList(), out.summary,
+  bool lineStatesLater = s.mode == RunMode::exportReport && !corruptedLinesReported();
+  ConsoleMessages console;
+  rc = buildSummary(*out.data, out.sortOrder, out.hitsPolicy, adjustmentList(), console, out.summary,
                     !lineStatesLater);
   if (rc != allOK) {
     reportError(rc, "Couldn't summarize information:\n%s\n", errorMessage(rc).c_str());

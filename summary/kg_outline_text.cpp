@@ -320,11 +320,12 @@ void KG_SummaryOverall::resort(std::uint32_t order, bool force) {
   if (hooks.endBusy) hooks.endBusy();
 }
 
-ErrorCode KG_SummaryOverall::replace_data(std::unique_ptr<KgvData> data) {
+ErrorCode KG_SummaryOverall::replace_data(std::unique_ptr<KgvData> data, MessageSink& messages) {
   KG_SummaryHooks& hooks = kgSummaryHooks();
   if (!data) return allOK;
   std::unique_ptr<SumRoot> fresh;
-  ErrorCode rc = buildSummary(*data, summary_->sortOrder, summary_->hitsPolicy, adjustmentList(), fresh);
+  ErrorCode rc =
+      buildSummary(*data, summary_->sortOrder, summary_->hitsPolicy, adjustmentList(), messages, fresh);
   if (rc != allOK || !fresh) {
     if (hooks.showError) hooks.showError(kgMessageText("sortCombinedData", "Unable to sort combined data"), rc);
     return rc == allOK ? corruptKgvFile : rc;

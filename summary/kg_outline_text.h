@@ -15,6 +15,7 @@
 #include "summary/kg_columns.h"
 #include "summary/name_style.h"
 #include "support/errors.h"
+#include "support/message_sink.h"
 
 // What the rows ask of the window around them; each may be left empty (tests, no window).
 struct KG_SummaryHooks {
@@ -88,7 +89,8 @@ class KG_SummaryOverall : public KG_OutlineText {
   void resort(std::uint32_t order, bool force);
   // Summarises new data and shows them in place of the old, keeping expansion and selection
   // by name. On failure the old data stay and the failure is reported; the code is returned.
-  ErrorCode replace_data(std::unique_ptr<KgvData> data);
+  // Notices about damaged line numbers go to `messages`.
+  ErrorCode replace_data(std::unique_ptr<KgvData> data, MessageSink& messages);
 
   void count_adjustment_added(std::uint32_t kind, int deadFunctionDelta);
   void count_adjustment_removed(std::uint32_t kind, int deadFunctionDelta);

@@ -29,6 +29,7 @@
 #include "summary/sum_frame.h"
 #include "support/atomic_write.h"
 #include "support/diagnostic.h"
+#include "support/message_sink.h"
 #include "toolkit/oi_application.h"
 #include "toolkit/oi_dialogs.h"
 #include "toolkit/oi_window.h"
@@ -84,7 +85,8 @@ void KG_SumFrame::reload_all() {
   std::vector<std::string> ignored;
   std::unique_ptr<KgvData> data;
   std::size_t failed = 0;
-  ErrorCode rc = loadAllKgvFiles(state_.loadedFiles, state_.mergeMode, &ignored, data, failed);
+  ConsoleMessages console;
+  ErrorCode rc = loadAllKgvFiles(state_.loadedFiles, state_.mergeMode, &ignored, console, data, failed);
   if (rc != allOK && rc != mergeIgnored) {
     std::string name = failed < state_.loadedFiles.size() ? state_.loadedFiles[failed].givenName : "";
     show_error(rc, kgMessageText("cannotReloadFiles", "Couldn't reload files due to problem reloading\n") +
@@ -94,7 +96,7 @@ void KG_SumFrame::reload_all() {
   std::sort(ignored.begin(), ignored.end());
   ignored.erase(std::unique(ignored.begin(), ignored.end()), ignored.end());
   reportLoadResult(rc, ignored);
-  all->replace_data(std::move(data));
+  all->replace_data(std::move(data), console);
 }
 
 void KG_SumFrame::add_data_file(const std::string& path) {
@@ -115,13 +117,14 @@ void KG_SumFrame::add_data_file(const std::string& path) {
   }
   std::vector<std::string> ignored;
   std::unique_ptr<KgvData> merged;
-  rc = mergeKgvDataCopy(state_.mergeMode, all->data(), *added, &ignored, merged);
+  ConsoleMessages console;
+  rc = mergeKgvDataCopy(state_.mergeMode, all->data(), *added, &ignored, console, merged);
   if ((rc != allOK && rc != mergeIgnored) || !merged) {
     show_error(rc, kgMessageText("cannotCombineData", "Couldn't combine new data with data already loaded"));
     return;
   }
   reportLoadResult(rc, ignored);
-  if (all->replace_data(std::move(merged)) == allOK) state_.loadedFiles.push_back(ref);
+  if (all->replace_data(std::move(merged), console) == allOK) state_.loadedFiles.push_back(ref);
 }
 
 void KG_SumFrame::askAndAddDataFile() {
@@ -141,7 +144,8 @@ void KG_SumFrame::writeExportTo() {
   std::string path;
   KG_SummaryOverall* all = overall();
   if (all == nullptr || !askFile(kgSettings().exportKgvFilePrompt.c_str(), path)) return;
-  ErrorCode rc = exportToFile(all->summary(), path);
+  ConsoleMessages console;
+  ErrorCode rc = exportToFile(all->summary(), path, console);
   if (rc != allOK) show_error(rc, "Couldn't export");
 }
 
@@ -194,7 +198,8 @@ void KG_SumFrame::extract_adjustments() {
   ExtractionOutcome o;
   {
     BusyScope busy(*this, nullptr);
-    o = extractAllAdjustments(all->summary(), "", question);
+    ConsoleMessages console;
+    o = extractAllAdjustments(all->summary(), "", question, console);
   }
   if (!o.performed) return;
   all->refresh_subtree();

@@ -10,9 +10,13 @@
 #include "adjust/export_report.h"
 #include "coverage/summary_build.h"
 #include "coverage/summary_sort.h"
+#include "support/message_sink.h"
 #include "tests/coverage/kgv_test_util.h"
 
 namespace {
+
+// Where the engine's notices go; these tests do not look at them.
+MessageList gMessages;
 
 // Two directories; dead, tested and inspected lines; saturated counts; a function without
 // a line entry; several blocks on one line.
@@ -58,7 +62,7 @@ struct Report {
 std::unique_ptr<Report> smallReport(std::uint32_t order) {
   auto r = std::make_unique<Report>();
   r->data = kgtest::readOk(kgtest::makeKgv(r->dir, "small.kgv", kSmallData));
-  EXPECT_EQ(buildSummary(*r->data, order, hitsMax, smallAdjustments(), r->root), allOK);
+  EXPECT_EQ(buildSummary(*r->data, order, hitsMax, smallAdjustments(), gMessages, r->root), allOK);
   return r;
 }
 
@@ -67,7 +71,7 @@ std::string exportText(const SumRoot& root, std::time_t when) {
   std::string path = dir.file("out.txt");
   FILE* f = fopen(path.c_str(), "w");
   EXPECT_NE(f, nullptr);
-  EXPECT_EQ(writeExport(f, root, when), allOK);
+  EXPECT_EQ(writeExport(f, root, when, gMessages), allOK);
   fclose(f);
   return kgtest::readFile(path);
 }
@@ -113,7 +117,7 @@ TEST_F(InUtc, LineStatesMadeWhileWritingGiveTheSameReport) {
   r.data = kgtest::readOk(kgtest::makeKgv(r.dir, "small.kgv", kSmallData));
   AdjustmentList saved = std::move(adjustmentList());
   adjustmentList() = smallAdjustments();
-  ASSERT_EQ(buildSummary(*r.data, 1, hitsMax, adjustmentList(), r.root, false), allOK);
+  ASSERT_EQ(buildSummary(*r.data, 1, hitsMax, adjustmentList(), gMessages, r.root, false), allOK);
   EXPECT_TRUE(noLineStatesKept(*r.root));
   std::string text = exportText(*r.root, 1700000000);
   adjustmentList() = std::move(saved);
@@ -150,13 +154,13 @@ TEST(ExportWriting, AReaderThatClosesItsEndEarlyIsNoFailure) {
   kgtest::TempDir dir;
   auto data = kgtest::readOk(kgtest::makeKgv(dir, "g.kgv", "generate records=300 functions=5 blocks=8\n"));
   std::unique_ptr<SumRoot> root;
-  ASSERT_EQ(buildSummary(*data, 1, hitsMax, {}, root), allOK);
+  ASSERT_EQ(buildSummary(*data, 1, hitsMax, {}, gMessages, root), allOK);
   int fds[2];
   ASSERT_EQ(pipe(fds), 0);
   close(fds[0]);
   FILE* w = fdopen(fds[1], "w");
   auto old = signal(SIGPIPE, SIG_IGN);
-  EXPECT_EQ(writeExport(w, *root), allOK);
+  EXPECT_EQ(writeExport(w, *root, gMessages), allOK);
   EXPECT_EQ(pendingSystemError(), "");
   signal(SIGPIPE, old);
   fclose(w);
@@ -166,7 +170,7 @@ TEST(ExportWriting, AFullDiskIsAWriteFailure) {
   FILE* full = fopen("/dev/full", "w");
   if (!full) GTEST_SKIP() << "no /dev/full";
   SumRoot empty;
-  EXPECT_EQ(writeExport(full, empty), fileWriteFailed);
+  EXPECT_EQ(writeExport(full, empty, gMessages), fileWriteFailed);
   EXPECT_NE(errorMessage(fileWriteFailed).find("space"), std::string::npos)
       << errorMessage(fileWriteFailed);
   fclose(full);
@@ -176,11 +180,11 @@ TEST(ExportWriting, ExportToAFileReplacesItOnlyWhenWhole) {
   kgtest::TempDir dir;
   SumRoot empty;
   std::string target = dir.file("report.txt");
-  EXPECT_EQ(exportToFile(empty, target), allOK);
+  EXPECT_EQ(exportToFile(empty, target, gMessages), allOK);
   std::string text = kgtest::readFile(target);
   const std::string totals = "to\t0\t0\t0\t0\t0\t0\t0\t0\n";
   ASSERT_GT(text.size(), totals.size());
   EXPECT_EQ(text.substr(text.size() - totals.size()), totals);
-  EXPECT_EQ(exportToFile(empty, dir.file("missing/dir/report.txt")), writeError);
+  EXPECT_EQ(exportToFile(empty, dir.file("missing/dir/report.txt"), gMessages), writeError);
   EXPECT_EQ(kgtest::filesIn(dir.path()).size(), 1u);  // no temporary file left behind
 }

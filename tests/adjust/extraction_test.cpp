@@ -8,9 +8,13 @@
 #include "adjust/extraction.h"
 #include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
+#include "support/message_sink.h"
 #include "tests/coverage/kgv_test_util.h"
 
 namespace {
+
+// Where the engine's notices go; these tests do not look at them.
+MessageList gMessages;
 
 class Counting : public ExtractionQuestion {
  public:
@@ -38,7 +42,7 @@ struct Project {
     data = kgtest::readOk(kgtest::makeKgv(dir, "p.kgv", text));
     adjustmentList().clear();
     readAdjustmentsFile(dir.file("adjust"));
-    EXPECT_EQ(buildSummary(*data, 1, hitsMax, adjustmentList(), root), allOK);
+    EXPECT_EQ(buildSummary(*data, 1, hitsMax, adjustmentList(), gMessages, root), allOK);
   }
   std::string path(const std::string& f) const { return dir.file(f); }
 };
@@ -56,7 +60,7 @@ TEST(Extraction, OneFileWithMarkersIsReadAndTheFiguresChange) {
   kgtest::writeFile(p.path("one.c"), "int f() {\n  g(); /* kestrel: deadcode */\n  h();\n}\n");
   EXPECT_EQ(p.root->counts.adjUnusedLines, 2u);
   AlwaysContinue yes;
-  ExtractionOutcome out = extractAllAdjustments(*p.root, "", yes);
+  ExtractionOutcome out = extractAllAdjustments(*p.root, "", yes, gMessages);
   ASSERT_TRUE(out.performed);
   EXPECT_EQ(out.lines, (std::vector<std::string>{
                            "Of 1 file in the Kestrelgauge data, 0 were missing",
@@ -78,7 +82,7 @@ TEST(Extraction, MissingAndBinaryFilesAreNamedAndKeepTheirOldAdjustments) {
   old->addRange(adjLineDead, 2, 2);
   adjustmentList().storeSet(std::move(old), p.path("gone.c"), 5);
   AlwaysContinue yes;
-  ExtractionOutcome out = extractAllAdjustments(*p.root, "", yes);
+  ExtractionOutcome out = extractAllAdjustments(*p.root, "", yes, gMessages);
   ASSERT_GE(out.lines.size(), 7u);
   EXPECT_EQ(out.lines[0], "Of 4 files in the Kestrelgauge data, 1 was missing");
   EXPECT_EQ(out.lines[1], "and 1 was ignored because it contained binary data.");
@@ -99,7 +103,7 @@ TEST(Extraction, TheFileOfTheSourceWindowIsSkippedAndSaidSo) {
   Project p({"shown.c", "other.c"});
   kgtest::writeFile(p.path("other.c"), "y();\n");
   AlwaysContinue yes;
-  ExtractionOutcome out = extractAllAdjustments(*p.root, p.path("shown.c"), yes);
+  ExtractionOutcome out = extractAllAdjustments(*p.root, p.path("shown.c"), yes, gMessages);
   EXPECT_EQ(out.lines, (std::vector<std::string>{
                            "Of 2 files in the Kestrelgauge data, 0 were missing,",
                            "the file in the annotated source window was skipped because",
@@ -112,7 +116,7 @@ TEST(Extraction, ManyFilesAskFirstAndADeclineChangesNothing) {
   kgtest::writeFile(p.path("a.c"), "x(); // kestrel: tested\n");
   setAdjustSettingsProvider(lowThreshold);
   Counting no(false);
-  ExtractionOutcome out = extractAllAdjustments(*p.root, "", no);
+  ExtractionOutcome out = extractAllAdjustments(*p.root, "", no, gMessages);
   setAdjustSettingsProvider(nullptr);
   EXPECT_FALSE(out.performed);
   EXPECT_TRUE(out.lines.empty());

@@ -7,6 +7,7 @@
 
 #include "coverage/kgv_load.h"
 #include "coverage/kgv_lock.h"
+#include "startup/console_report.h"
 #include "tests/coverage/kgv_test_util.h"
 
 using namespace kgtest;

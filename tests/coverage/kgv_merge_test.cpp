@@ -39,6 +39,7 @@ struct Loaded {
   ErrorCode rc = 0;
   std::unique_ptr<KgvData> data;
   std::vector<std::string> ignored;
+  MessageList messages;
   size_t count = 0;
 };
 
@@ -46,7 +47,7 @@ Loaded loadAll(const std::vector<std::string>& paths, std::uint32_t mode) {
   std::vector<KgvFileRef> refs;
   for (const auto& p : paths) refs.push_back(makeKgvFileRef(p));
   Loaded l;
-  l.rc = loadAllKgvFiles(refs, mode, &l.ignored, l.data, l.count);
+  l.rc = loadAllKgvFiles(refs, mode, &l.ignored, l.messages, l.data, l.count);
   if (l.rc == allOK || l.rc == mergeIgnored) {
     for (const auto& r : refs) EXPECT_NE(r.loadTime, 0u) << "a loaded file knows when it was read";
   }
@@ -134,7 +135,8 @@ TEST(Merging, WhereOneRunSplitsABlockBothSidesUseTheBlockCount) {
   };
   fill(*x.records[0], TagBlockLine, 4, 0);  // line 6 belongs to the block of line 5
   fill(*r.records[0], TagBlock, 3, 2);      // here line 6 is a block of its own
-  ASSERT_EQ(mergeKgvData(kMergeNewestWins, x, r, nullptr), allOK);
+  MessageList messages;
+  ASSERT_EQ(mergeKgvData(kMergeNewestWins, x, r, nullptr, messages), allOK);
   EXPECT_EQ(describeMap(*x.records[0]), "F:s.c:2 b:5:7 b:6:6 ");
 }
 
@@ -198,26 +200,39 @@ blockline 32
             "fn:delta:1 fl:25:0 b:26:1 bl:27:0 fn:gamma:3 fl:30:0 b:31:2 b:32:1 ");
 }
 
-TEST(Merging, JavaDataAfterCDataAreSetAsideWithAWarning) {
+TEST(Merging, JavaDataAfterCDataAreSetAsideWithAWarningToTheCaller) {
   TempDir dir;
   std::string c = makeKgv(dir, "c.kgv", kOld);
   std::string java = makeKgv(dir, "java.kgv", "java 1\nrecord Main.java\nfunction main line=1\n");
   testing::internal::CaptureStderr();
+  testing::internal::CaptureStdout();
   Loaded l = loadAll({c, java}, kMergeNewestWins);
-  EXPECT_EQ(testing::internal::GetCapturedStderr(),
-            "Warn: Found Java .kgv files when processing C/C++ .kgv files.\n");
+  Loaded j = loadAll({java, c}, kMergeNewestWins);
+  // The loader itself prints nothing: the warning is the caller's to show.
+  EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+  EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
+
+  ASSERT_EQ(l.messages.messages.size(), 1u);
+  EXPECT_TRUE(l.messages.messages[0].warning);
+  EXPECT_EQ(l.messages.messages[0].text, "Warn: Found Java .kgv files when processing C/C++ .kgv files.\n");
   EXPECT_EQ(l.rc, mergeIgnored);
   ASSERT_EQ(l.data->records.size(), 1u);
   EXPECT_STREQ(l.data->records[0]->fileName(), "s.c");
-  EXPECT_FALSE(kgvIsJava());
 
-  testing::internal::CaptureStderr();
-  Loaded j = loadAll({java, c}, kMergeNewestWins);
-  EXPECT_EQ(testing::internal::GetCapturedStderr(),
-            "Warn: Found C/C++ .kgv files when processing Java .kgv files.\n");
+  ASSERT_EQ(j.messages.messages.size(), 1u);
+  EXPECT_EQ(j.messages.messages[0].text, "Warn: Found C/C++ .kgv files when processing Java .kgv files.\n");
   EXPECT_EQ(j.rc, mergeIgnored);
   EXPECT_TRUE(kgvIsJava());
   EXPECT_STREQ(j.data->records[0]->fileName(), "Main.java");
+
+  // Adding a Java file to C data in the window takes the same way.
+  auto shown = readOk(c);
+  auto added = readOk(java);
+  MessageList messages;
+  std::unique_ptr<KgvData> copy;
+  EXPECT_EQ(mergeKgvDataCopy(kMergeNewestWins, *shown, *added, nullptr, messages, copy), mergeIgnored);
+  ASSERT_EQ(messages.messages.size(), 1u);
+  EXPECT_EQ(messages.messages[0].text, l.messages.messages[0].text);
 }
 
 TEST(Merging, AddingAFileOfNewSourcesAppendsThemInOrder) {
@@ -226,7 +241,8 @@ TEST(Merging, AddingAFileOfNewSourcesAppendsThemInOrder) {
   auto added = readOk(makeKgv(dir, "b.kgv", "record z.c\nfunction z line=1\nrecord m.c\nfunction m line=1\n"));
   ASSERT_TRUE(shown && added);
   std::unique_ptr<KgvData> copy;
-  ASSERT_EQ(mergeKgvDataCopy(kMergeNewestWins, *shown, *added, nullptr, copy), allOK);
+  MessageList messages;
+  ASSERT_EQ(mergeKgvDataCopy(kMergeNewestWins, *shown, *added, nullptr, messages, copy), allOK);
   ASSERT_EQ(copy->records.size(), 3u);
   EXPECT_STREQ(copy->records[1]->fileName(), "z.c");
   EXPECT_STREQ(copy->records[2]->fileName(), "m.c");
@@ -234,7 +250,7 @@ TEST(Merging, AddingAFileOfNewSourcesAppendsThemInOrder) {
   EXPECT_EQ(copy->recordSizes.size(), 3u);
   EXPECT_EQ(shown->records.size(), 1u);  // the data merged from a copy stay as they were
 
-  ASSERT_EQ(mergeKgvData(kMergeNewestWins, *shown, *added, nullptr), allOK);
+  ASSERT_EQ(mergeKgvData(kMergeNewestWins, *shown, *added, nullptr, messages), allOK);
   EXPECT_EQ(shown->records.size(), 3u);
   EXPECT_EQ(added->records.size(), 2u);  // the data merged from are never consumed
 }
@@ -251,5 +267,6 @@ TEST(Merging, AFileThatCannotBeLoadedStopsTheLoadAndIsNamed) {
   std::vector<KgvFileRef> none;
   std::unique_ptr<KgvData> d;
   size_t n = 0;
-  EXPECT_EQ(loadAllKgvFiles(none, kMergeNewestWins, nullptr, d, n), noFileName);
+  MessageList messages;
+  EXPECT_EQ(loadAllKgvFiles(none, kMergeNewestWins, nullptr, messages, d, n), noFileName);
 }

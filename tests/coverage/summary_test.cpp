@@ -9,9 +9,13 @@
 #include "coverage/sort_orders.h"
 #include "coverage/summary_build.h"
 #include "coverage/summary_sort.h"
+#include "support/message_sink.h"
 #include "tests/coverage/kgv_test_util.h"
 
 namespace {
+
+// Where the engine's notices go; these tests do not look at them.
+MessageList gMessages;
 
 struct Built {
   kgtest::TempDir dir;
@@ -25,7 +29,7 @@ std::unique_ptr<Built> build(const std::string& text, const AdjustmentList& adj 
   auto b = std::make_unique<Built>();
   b->data = kgtest::readOk(kgtest::makeKgv(b->dir, "t.kgv", text));
   if (!b->data) return b;
-  b->rc = buildSummary(*b->data, order, policy, adj, b->root);
+  b->rc = buildSummary(*b->data, order, policy, adj, gMessages, b->root);
   return b;
 }
 
@@ -171,7 +175,7 @@ TEST(SummaryAdjusted, DeadTestedAndInspectedLinesCountWhereTheyShould) {
   EXPECT_TRUE(ls[5].flags & LineFuncEnd);
 
   // Without the set the same data count every unused line.
-  ASSERT_EQ(recomputeSummary(*b->root, hitsMax, AdjustmentList{}), allOK);
+  ASSERT_EQ(recomputeSummary(*b->root, hitsMax, AdjustmentList{}, gMessages), allOK);
   EXPECT_EQ(fn.counts.adjLines, 5u);
   EXPECT_EQ(fn.counts.adjUnusedLines, 4u);
   EXPECT_EQ(onlyFile(*b->root).lineStates[1].flags & adjAnyMask, 0u);
@@ -303,9 +307,9 @@ TEST(SummaryTree, ABlockLineBeforeItsBlockNeverMakesTheSortedDataUnreadable) {
   const ObjRecord& rec = *b->data->records[0];
   EXPECT_EQ(kgtest::describeMap(rec), "F:s.c:1 fn:f:1 fl:1:0 b:4:0 bl:3:0 b:5:5 ");
   std::unique_ptr<SumRoot> again;
-  ASSERT_EQ(buildSummary(*b->data, 1, hitsMax, {}, again), allOK);
+  ASSERT_EQ(buildSummary(*b->data, 1, hitsMax, {}, gMessages, again), allOK);
   EXPECT_EQ(kgtest::describeMap(rec), "F:s.c:1 fn:f:1 fl:1:0 b:4:0 bl:3:0 b:5:5 ");
-  EXPECT_EQ(recomputeSummary(*again, hitsMax, {}), allOK);
+  EXPECT_EQ(recomputeSummary(*again, hitsMax, {}, gMessages), allOK);
 }
 
 TEST(SummaryTree, BlocksOutOfOrderAreSortedOnceInTheData) {
@@ -327,7 +331,7 @@ TEST(SummaryTree, BlocksOutOfOrderAreSortedOnceInTheData) {
   // Stable: a second build over the sorted data leaves the map alone.
   std::string once = kgtest::describeMap(rec);
   std::unique_ptr<SumRoot> again;
-  ASSERT_EQ(buildSummary(*b->data, 1, hitsMax, {}, again), allOK);
+  ASSERT_EQ(buildSummary(*b->data, 1, hitsMax, {}, gMessages, again), allOK);
   EXPECT_EQ(kgtest::describeMap(rec), once);
 }
 
@@ -510,7 +514,7 @@ TEST(SummaryTree, DamagedMapsGiveCorruptDataOrATreeButNeverACrash) {
     KgvData data;
     for (int k = 0; k < 4; ++k) data.records.push_back(randomRecord(rng, round + k));
     std::unique_ptr<SumRoot> root;
-    ErrorCode rc = buildSummary(data, 1 + round % 17, 1 + round % 4, adj, root);
+    ErrorCode rc = buildSummary(data, 1 + round % 17, 1 + round % 4, adj, gMessages, root);
     if (rc == allOK) {
       ++trees;
       ASSERT_NE(root, nullptr);
@@ -519,17 +523,17 @@ TEST(SummaryTree, DamagedMapsGiveCorruptDataOrATreeButNeverACrash) {
           ASSERT_EQ(f.lineStates.size(), f.lineCount);
           for (const SumFunc& fn : f.functions) ASSERT_LE(fn.lastLine, f.lineCount);
         }
-      ASSERT_EQ(recomputeSummary(*root, hitsMin, AdjustmentList{}), allOK);
+      ASSERT_EQ(recomputeSummary(*root, hitsMin, AdjustmentList{}, gMessages), allOK);
       // A second build over the data as the first one left it succeeds too.
       std::unique_ptr<SumRoot> again;
-      ASSERT_EQ(buildSummary(data, 1, hitsMax, adj, again), allOK);
+      ASSERT_EQ(buildSummary(data, 1, hitsMax, adj, gMessages, again), allOK);
       // And the report is written from either tree, the second making line states as it goes.
       std::unique_ptr<SumRoot> lazy;
-      ASSERT_EQ(buildSummary(data, 1, hitsMax, adj, lazy, false), allOK);
+      ASSERT_EQ(buildSummary(data, 1, hitsMax, adj, gMessages, lazy, false), allOK);
       FILE* sink = fopen("/dev/null", "w");
       ASSERT_NE(sink, nullptr);
-      EXPECT_EQ(writeExport(sink, *again), allOK);
-      EXPECT_EQ(writeExport(sink, *lazy), allOK);
+      EXPECT_EQ(writeExport(sink, *again, gMessages), allOK);
+      EXPECT_EQ(writeExport(sink, *lazy, gMessages), allOK);
       fclose(sink);
     } else {
       ++corrupt;

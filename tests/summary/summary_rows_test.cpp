@@ -9,10 +9,14 @@
 #include "summary/cell_format.h"
 #include "summary/kg_columns.h"
 #include "summary/kg_outline_text.h"
+#include "support/message_sink.h"
 #include "tests/coverage/kgv_test_util.h"
 #include "tests/outline/recording_display.h"
 
 namespace {
+
+// Where the engine's notices go; these tests do not look at them.
+MessageList gMessages;
 
 // Two directories; one file without functions; one function never called.
 const char kProgram[] =
@@ -35,7 +39,7 @@ struct Viewer {
   explicit Viewer(const std::string& text, std::uint32_t order = 1) {
     data = kgtest::readOk(kgtest::makeKgv(dir, "a.kgv", text));
     std::unique_ptr<SumRoot> sum;
-    EXPECT_EQ(buildSummary(*data, order, 1, AdjustmentList{}, sum), allOK);
+    EXPECT_EQ(buildSummary(*data, order, 1, AdjustmentList{}, gMessages, sum), allOK);
     display = new RecordingDisplay();
     root = std::make_unique<KG_OutlineRoot>(display);
     overall = new KG_SummaryOverall(std::move(data), std::move(sum));
@@ -223,7 +227,7 @@ TEST_F(SummaryRows, NewDataReplaceTheOutlineKeepingOpenRowsByName) {
   std::string more = kProgram;
   more += "record lib/extra.c first=1700000100 last=1700000300\nfunction extra line=1 calls=0\nblock 2\n";
   auto data = kgtest::readOk(kgtest::makeKgv(v.dir, "b.kgv", more));
-  ASSERT_EQ(v.overall->replace_data(std::move(data)), allOK);
+  ASSERT_EQ(v.overall->replace_data(std::move(data), gMessages), allOK);
   EXPECT_TRUE(v.row("main.c")->is_expanded());
   ASSERT_EQ(v.root->selection_count(), 1u);
   EXPECT_STREQ(static_cast<KG_OutlineText*>(v.root->selected(0))->name(), "main");

@@ -1,0 +1,16 @@
+// The console's message sink.
+#include "support/message_sink.h"
+
+#include <cstdio>
+
+void ConsoleMessages::warning(const std::string& text) {
+  fflush(stdout);
+  fputs(text.c_str(), stderr);
+  fflush(stderr);
+}
+
+void ConsoleMessages::notice(const std::string& text) {
+  fflush(stderr);
+  fputs(text.c_str(), stdout);
+  fflush(stdout);
+}
