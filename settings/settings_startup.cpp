@@ -15,7 +15,6 @@ std::vector<std::string> loadResourceSettings(const ResourceSettingsInput& in) {
   XrmDatabase db = buildResourceDatabase(in, warnings);
   buildSettings(ResourceSource{db, &warnings});
   installErrorTextLookup();
-  if (in.isJava) mergeJavaResourceFiles(in.installDir);
   return warnings;
 }
 

@@ -14,9 +14,7 @@
 //   ... load the data files ...
 //   if (isJava) mergeJavaResourceFiles(home);
 //   int order = sortOption given and valid ? its id : defaultSortOrder();
-struct ResourceSettingsInput : ResourceDatabaseInput {
-  bool isJava = false;  // merge the Java message and label files at once
-};
+using ResourceSettingsInput = ResourceDatabaseInput;
 
 // Start-up step 7: points OI_LIB at the installation's "UI" directory, builds the merged
 // resource database, reads every resource of the table and installs the user's texts for

@@ -26,6 +26,24 @@ void reportError(ErrorCode, const char* fmt, ...) {
   fflush(stderr);
 }
 
+void reportOutOfDate(const std::vector<std::string>& ignored) {
+  if (ignored.empty()) {
+    reportError(mergeIgnored, "%s", errorMessage(mergeIgnored).c_str());
+    return;
+  }
+  std::string text = ignored.size() == 1 ? "Some coverage for this file was out of date:"
+                                         : "Some coverage for these files was out of date:";
+  for (const auto& name : ignored) text += "\n" + name;
+  reportError(mergeIgnored, "%s", text.c_str());
+}
+
+void reportAdjustmentProblems(const std::vector<std::string>& problems) {
+  if (problems.empty()) return;
+  std::string text = "Problems reading adjustments:";
+  for (const auto& p : problems) text += "\n" + p;
+  reportError(errorOccured, "%s", text.c_str());
+}
+
 const char* const kUsageErrorText =
     "Kestrelgauge must be invoked in one of these forms:\n"
     "    kestrel -view\n"

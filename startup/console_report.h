@@ -1,13 +1,20 @@
-// Start-up's console reporting: the "Kestrelgauge: " messages of failures, the usage error
-// and the exit with the status of a result code.
+// Start-up's console reporting: the "Kestrelgauge: " messages of failures and notes, the
+// usage error, the exit with the status of a result code, and the lock-wait lines.
 #pragma once
 
 #include <string>
+#include <vector>
 
 #include "support/errors.h"
 
 // Console report: "Kestrelgauge: " + text, a newline if missing, then an empty line.
 void reportError(ErrorCode code, const char* fmt, ...) __attribute__((format(printf, 2, 3)));
+
+// The note that data were set aside as out of date, naming the source files concerned;
+// the code's message when none are known.
+void reportOutOfDate(const std::vector<std::string>& ignored);
+// "Problems reading adjustments:" and the messages; nothing when there are none.
+void reportAdjustmentProblems(const std::vector<std::string>& problems);
 
 // How the product's command must be started; printed when the installation directory is missing.
 extern const char* const kUsageErrorText;

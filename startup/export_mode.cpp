@@ -5,7 +5,6 @@
 
 #include "adjust/export_report.h"
 #include "startup/console_report.h"
-#include "startup/merge_mode.h"
 #include "support/message_sink.h"
 
 ErrorCode runExportMode(StartupSummary& prepared) {

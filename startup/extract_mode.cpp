@@ -7,7 +7,6 @@
 #include "adjust/adjustments_file.h"
 #include "adjust/extraction.h"
 #include "startup/console_report.h"
-#include "startup/merge_mode.h"
 #include "support/message_sink.h"
 
 ErrorCode runExtractMode(StartupSummary& prepared) {

@@ -6,17 +6,6 @@
 #include "startup/console_report.h"
 #include "startup/load_files.h"
 
-void reportOutOfDate(const std::vector<std::string>& ignored) {
-  if (ignored.empty()) {
-    reportError(mergeIgnored, "%s", errorMessage(mergeIgnored).c_str());
-    return;
-  }
-  std::string text = ignored.size() == 1 ? "Some coverage for this file was out of date:"
-                                         : "Some coverage for these files was out of date:";
-  for (const auto& name : ignored) text += "\n" + name;
-  reportError(mergeIgnored, "%s", text.c_str());
-}
-
 ErrorCode runMergeMode(StartupState& s) {
   const std::string& target = s.mergeTarget;
   // The loader's settings apply to the target's lock too.

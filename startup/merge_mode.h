@@ -14,7 +14,3 @@
 // and are no failure: the result is 1 then. Failures are reported on the console and
 // returned.
 ErrorCode runMergeMode(StartupState& s);
-
-// The note on standard error that data were set aside as out of date, naming the source
-// files concerned (the other modes that load data report it the same way).
-void reportOutOfDate(const std::vector<std::string>& ignored);

@@ -123,7 +123,9 @@ std::vector<KgvFileRef> buildFileList(const std::vector<std::string>& fileArgs) 
   return list;
 }
 
-ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, ViewerRun viewerRun) {
+ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, StartupSummary& prepared,
+                     bool& showWindow) {
+  showWindow = false;
   StartupState& s = startupState();
 
   // 1. Identity for all messages.
@@ -205,7 +207,6 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, ViewerRun
 
   if (s.mode == RunMode::merge) return runMergeMode(s);
 
-  StartupSummary prepared;
   ErrorCode rc = prepareStartupSummary(s, prepared);
   if (rc != allOK && rc != mergeIgnored) return rc;
 
@@ -213,9 +214,8 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, ViewerRun
   if (s.mode == RunMode::extract) return runExtractMode(prepared);
 
   // 16. The main window takes over.
-  if (viewerRun) return viewerRun(s, prepared);
-  reportError(notImplemented, "%s", errorMessage(notImplemented).c_str());
-  return notImplemented;
+  showWindow = true;
+  return rc;
 }
 
 ErrorCode startupSortOrder(const std::vector<ViewerOption>& options, std::uint32_t& order) {
@@ -246,13 +246,6 @@ ErrorCode applyHelpMaxWait(const std::vector<ViewerOption>& options) {
   }
   setOption(QUOR_HELP_MAX_WAIT, static_cast<std::intptr_t>(value));
   return allOK;
-}
-
-void reportAdjustmentProblems(const std::vector<std::string>& problems) {
-  if (problems.empty()) return;
-  std::string text = "Problems reading adjustments:";
-  for (const auto& p : problems) text += "\n" + p;
-  reportError(errorOccured, "%s", text.c_str());
 }
 
 ErrorCode prepareStartupSummary(StartupState& s, StartupSummary& out) {

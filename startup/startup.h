@@ -60,19 +60,16 @@ ErrorCode startupSortOrder(const std::vector<ViewerOption>& options, std::uint32
 // otherwise the value is reported (code 6) and start-up goes on. Returns the code.
 ErrorCode applyHelpMaxWait(const std::vector<ViewerOption>& options);
 
-// "Problems reading adjustments:" and the messages, on standard error; nothing when empty.
-void reportAdjustmentProblems(const std::vector<std::string>& problems);
-
 // The version banner: product, version, build date and platform, then the two directories.
 std::string versionBanner(const StartupState& s);
 extern const char* const kUsageText;
 
-// Checks that a display can be reached (the GUI program supplies it); returns allOK or 8.
+// Checks that a display can be reached (the program supplies it); returns allOK or 8.
 using DisplayCheck = ErrorCode (*)(int& argc, char** argv);
 
-// The whole program: start-up steps, the load steps, then the mode. Returns the code the
-// process exits with (mapped by exitWithCode).
-// The window mode's hand-over (start-up step 16); the GUI program supplies it.
-using ViewerRun = ErrorCode (*)(StartupState& s, StartupSummary& prepared);
-
-ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, ViewerRun viewerRun = nullptr);
+// Start-up steps, the load steps, then a console mode run to its end. For the window mode
+// it stops once the summary is built: `showWindow` is set and `prepared` holds what the
+// window is to show (start-up step 16 is the program's). Returns the code so far, which the
+// process exits with (mapped by exitWithCode) unless the window runs.
+ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, StartupSummary& prepared,
+                     bool& showWindow);

@@ -7,7 +7,7 @@
 
 #include "startup/console_report.h"
 #include "startup/startup.h"
-#include "summary/sum_frame.h"
+#include "summary/main_window.h"
 #include "support/diagnostic.h"
 #include "support/errors.h"
 
@@ -42,9 +42,32 @@ ErrorCode checkDisplay(int& argc, char** argv) {
   return allOK;
 }
 
+// Start-up step 16: the main window takes over the data and the file list.
+ErrorCode showMainWindow(StartupState& s, StartupSummary& prepared) {
+  MainWindowInput input;
+  input.installDir = s.installDir;
+  input.versionText = versionBanner(s);
+  input.loadedFiles = std::move(s.loadedFiles);
+  input.mergeMode = s.mergeMode;
+  if (const ViewerOption* userpath = findGivenOption("userpath", s.options)) input.userPath = userpath->value;
+  input.data = std::move(prepared.data);
+  input.summary = std::move(prepared.summary);
+  input.loadStatus = prepared.loadStatus;
+  input.ignored = std::move(prepared.ignored);
+  input.adjustmentProblems = std::move(prepared.adjustmentProblems);
+  std::string failure;
+  ErrorCode rc = runMainWindow(input, failure);
+  if (rc != allOK && !failure.empty()) reportError(rc, "%s", failure.c_str());
+  return rc;
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
   kgInstallSignalHandlers();
-  exitWithCode(runProgram(argc, argv, checkDisplay, runMainWindow));
+  StartupSummary prepared;
+  bool showWindow = false;
+  ErrorCode rc = runProgram(argc, argv, checkDisplay, prepared, showWindow);
+  if (showWindow) rc = showMainWindow(startupState(), prepared);
+  exitWithCode(rc);
 }

@@ -13,6 +13,7 @@
 #include <memory>
 
 #include "coverage/kgv_lock.h"
+#include "settings/resource_table.h"
 #include "summary/kg_outline_text.h"
 #include "toolkit/oi_application.h"
 #include "toolkit/oi_xstring.h"
@@ -211,4 +212,16 @@ bool windowLockReporter(int event, const std::string& path, const std::string&) 
   if (lastAsked != 0 && now - lastAsked < 20000) return true;
   lastAsked = now;
   return ask_continue("Lock on " + path + "\nbusy; waiting for the lock.");
+}
+
+void showLoadResult(ErrorCode status, const std::vector<std::string>& ignored) {
+  KG_Settings& s = kgSettings();
+  if (status == allOK || !s.showMergeWarnings.value) return;
+  if (!ignored.empty() && s.showMergeWarningDetails.value) {
+    noteList(ignored.size() == 1 ? "Some coverage for this file was out of date:"
+                                 : "Some coverage for these files was out of date:",
+             ignored);
+  } else {
+    show_message(OI_Severity::warning, errorMessage(status));
+  }
 }

@@ -36,5 +36,10 @@ std::string continueQuestionText(const std::string& text);
 void noteList(const std::string& banner, const std::vector<std::string>& messages, bool separate = false,
               Widget parent = nullptr);
 
+// Out-of-date notes and other load results, as after start-up and after a reload: nothing
+// for 1 or when merge warnings are not wanted; the list of source files when details are
+// wanted and known, else the code's message.
+void showLoadResult(ErrorCode status, const std::vector<std::string>& ignored);
+
 // Lock waits and breaks asked through the continue question (at most every 20 s for waits).
 bool windowLockReporter(int event, const std::string& path, const std::string& lockName);

@@ -1,5 +1,5 @@
 // The main window: its parts in building order, the menus and toolbar, headings and stripes,
-// the busy box, and the start-up hand-over.
+// the busy box.
 #include "summary/sum_frame.h"
 
 #include <Xm/Xm.h>
@@ -31,8 +31,6 @@
 
 namespace {
 
-KG_SumFrame* gFrame = nullptr;
-
 // The seven cells of the Actions pulldown and the popup menu.
 const char* const kActionCells[][2] = {
     {"QR_OutlineCollapse", "Collapse"},
@@ -52,9 +50,7 @@ const char* const kStripeCells[][2] = {
 
 }  // namespace
 
-KG_SumFrame* kgSumFrame() { return gFrame; }
-
-KG_SumFrame::KG_SumFrame(StartupState& state) : state_(state) { gFrame = this; }
+KG_SumFrame::KG_SumFrame(MainWindowInput& input) : input_(input) {}
 
 KG_SumFrame::~KG_SumFrame() {
   kgSummaryHooks() = KG_SummaryHooks{};
@@ -63,7 +59,6 @@ KG_SumFrame::~KG_SumFrame() {
   root_ = nullptr;
   kgSetDialogHome(nullptr);
   window_.reset();
-  if (gFrame == this) gFrame = nullptr;
 }
 
 Widget KG_SumFrame::shell() const { return window_ ? XtParent(window_->mainWindow()) : nullptr; }
@@ -259,7 +254,7 @@ void KG_SumFrame::buildHelpMenu() {
   bar->setHelpPulldown(help);
 }
 
-void KG_SumFrame::showVersion() { show_message(OI_Severity::information, versionBanner(state_)); }
+void KG_SumFrame::showVersion() { show_message(OI_Severity::information, input_.versionText); }
 
 void KG_SumFrame::perform(const std::string& actionString) {
   if (root_ == nullptr) return;
@@ -432,7 +427,7 @@ void KG_SumFrame::startChangeRequest() {
 }
 
 void KG_SumFrame::exit_viewer() {
-  const std::string note = createUserDefaultsFromTemplate(state_.installDir);
+  const std::string note = createUserDefaultsFromTemplate(input_.installDir);
   if (!note.empty()) show_message(OI_Severity::information, note);
   OI_Application::instance()->quit();
 }

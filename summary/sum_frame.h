@@ -1,5 +1,5 @@
-// The main window: menus, toolbar, headings over the summary outline, the busy box, the data
-// operations of its File menu, and the hand-over from start-up to the event loop.
+// The main window: menus, toolbar, headings over the summary outline, the busy box and the
+// data operations of its File menu.
 #pragma once
 
 #include <X11/Intrinsic.h>
@@ -11,7 +11,7 @@
 
 #include "coverage/kgv_data.h"
 #include "coverage/summary_types.h"
-#include "startup/startup.h"
+#include "summary/main_window.h"
 #include "support/errors.h"
 
 class KG_OutlineRoot;
@@ -29,7 +29,9 @@ class QR_OI_ScrollTextGang;
 
 class KG_SumFrame {
  public:
-  explicit KG_SumFrame(StartupState& state);
+  // The installation, file list and merge mode of the input stay the caller's; the frame
+  // adds to the file list as the user opens more data files.
+  explicit KG_SumFrame(MainWindowInput& input);
   ~KG_SumFrame();
   KG_SumFrame(const KG_SumFrame&) = delete;
   KG_SumFrame& operator=(const KG_SumFrame&) = delete;
@@ -87,7 +89,7 @@ class KG_SumFrame {
   void showVersion();
   void startTimings();
 
-  StartupState& state_;
+  MainWindowInput& input_;
   std::unique_ptr<OI_TopLevel> window_;
   OI_GridBox* workArea_ = nullptr;
   KG_Toolbar* toolbar_ = nullptr;
@@ -106,12 +108,3 @@ class KG_SumFrame {
   bool busy_ = false;
   bool settingMenus_ = false;  // the program sets a menu: its callback does nothing
 };
-
-// The one main window while the viewer runs (null before and after).
-KG_SumFrame* kgSumFrame();
-
-// Start-up hands over here once the data are loaded and summarised: the toolkit opens the
-// display (unless start-up opened it already) with the settings' resource database, the window is built and shown with the data,
-// the load notes and adjustment problems are shown, and the event loop runs until exit.
-// Returns 1 on a normal exit, else the code of what failed.
-ErrorCode runMainWindow(StartupState& state, StartupSummary& prepared);

@@ -1,17 +1,13 @@
 // The main window's operations on data and files: adding and reloading data files, writing
-// data, export, outline and settings files, extraction, and the start-up hand-over.
+// data, export, outline and settings files, extraction.
 #include <Xm/Xm.h>
 
 #include <algorithm>
 #include <cerrno>
-#include <fnmatch.h>
-
-#include <csignal>
 
 #include "adjust/adjustments_file.h"
 #include "adjust/export_report.h"
 #include "adjust/extraction.h"
-#include "adjust/source_search_path.h"
 #include "coverage/kgv_file.h"
 #include "coverage/kgv_load.h"
 #include "coverage/kgv_lock.h"
@@ -20,9 +16,7 @@
 #include "outline/qr_oi_outline_display.h"
 #include "settings/resource_database.h"
 #include "settings/resource_table.h"
-#include "settings/settings_startup.h"
 #include "settings/settings_writer.h"
-#include "startup/console_report.h"
 #include "summary/kg_outline_text.h"
 #include "summary/name_style.h"
 #include "summary/sum_dialogs.h"
@@ -54,19 +48,6 @@ class BusyScope {
   KG_SumFrame& f_;
 };
 
-// Out-of-date notes and other load results, as after start-up and after a reload.
-void reportLoadResult(ErrorCode status, const std::vector<std::string>& ignored) {
-  KG_Settings& s = kgSettings();
-  if (status == allOK || !s.showMergeWarnings.value) return;
-  if (!ignored.empty() && s.showMergeWarningDetails.value) {
-    noteList(ignored.size() == 1 ? "Some coverage for this file was out of date:"
-                                 : "Some coverage for these files was out of date:",
-             ignored);
-  } else {
-    show_message(OI_Severity::warning, errorMessage(status));
-  }
-}
-
 bool askFile(const char* prompt, std::string& chosen) {
   return oiAskFileName(kgDialogHome(), "kgFileDialog", "Kestrelgauge", prompt, "", chosen) && !chosen.empty();
 }
@@ -80,22 +61,22 @@ class WindowQuestion : public ExtractionQuestion {
 
 void KG_SumFrame::reload_all() {
   KG_SummaryOverall* all = overall();
-  if (all == nullptr || state_.loadedFiles.empty()) return;
+  if (all == nullptr || input_.loadedFiles.empty()) return;
   BusyScope busy(*this, kgSettings().loadingKgvDataBusyMsg.c_str());
   std::vector<std::string> ignored;
   std::unique_ptr<KgvData> data;
   std::size_t failed = 0;
   ConsoleMessages console;
-  ErrorCode rc = loadAllKgvFiles(state_.loadedFiles, state_.mergeMode, &ignored, console, data, failed);
+  ErrorCode rc = loadAllKgvFiles(input_.loadedFiles, input_.mergeMode, &ignored, console, data, failed);
   if (rc != allOK && rc != mergeIgnored) {
-    std::string name = failed < state_.loadedFiles.size() ? state_.loadedFiles[failed].givenName : "";
+    std::string name = failed < input_.loadedFiles.size() ? input_.loadedFiles[failed].givenName : "";
     show_error(rc, kgMessageText("cannotReloadFiles", "Couldn't reload files due to problem reloading\n") +
                        shorten_path_leftmost(name, 80));
     return;
   }
   std::sort(ignored.begin(), ignored.end());
   ignored.erase(std::unique(ignored.begin(), ignored.end()), ignored.end());
-  reportLoadResult(rc, ignored);
+  showLoadResult(rc, ignored);
   all->replace_data(std::move(data), console);
 }
 
@@ -104,7 +85,7 @@ void KG_SumFrame::add_data_file(const std::string& path) {
   if (all == nullptr) return;
   BusyScope busy(*this, kgSettings().loadingKgvDataBusyMsg.c_str());
   KgvFileRef ref = makeKgvFileRef(path);
-  if (findKgvFileRef(state_.loadedFiles, ref.resolvedName) >= 0) {
+  if (findKgvFileRef(input_.loadedFiles, ref.resolvedName) >= 0) {
     show_message(OI_Severity::error, errorDialogText(duplicateFile, kgMessageText("cannotOpenFile", "Can't open requested file")) +
                                          "\nUse 'Reload all' to reread previously loaded data.");
     return;
@@ -118,13 +99,13 @@ void KG_SumFrame::add_data_file(const std::string& path) {
   std::vector<std::string> ignored;
   std::unique_ptr<KgvData> merged;
   ConsoleMessages console;
-  rc = mergeKgvDataCopy(state_.mergeMode, all->data(), *added, &ignored, console, merged);
+  rc = mergeKgvDataCopy(input_.mergeMode, all->data(), *added, &ignored, console, merged);
   if ((rc != allOK && rc != mergeIgnored) || !merged) {
     show_error(rc, kgMessageText("cannotCombineData", "Couldn't combine new data with data already loaded"));
     return;
   }
-  reportLoadResult(rc, ignored);
-  if (all->replace_data(std::move(merged), console) == allOK) state_.loadedFiles.push_back(ref);
+  showLoadResult(rc, ignored);
+  if (all->replace_data(std::move(merged), console) == allOK) input_.loadedFiles.push_back(ref);
 }
 
 void KG_SumFrame::askAndAddDataFile() {
@@ -176,7 +157,7 @@ void KG_SumFrame::updateUserDefaultsFile() {
   SettingsOutcome o;
   {
     BusyScope busy(*this, nullptr);
-    o = updateUserDefaults(state_.installDir);
+    o = updateUserDefaults(input_.installDir);
   }
   for (const std::string& w : o.consoleWarnings) kgWarning("%s", w.c_str());
   if (o.code != allOK) show_error(o.code, o.context);
@@ -206,89 +187,4 @@ void KG_SumFrame::extract_adjustments() {
   if (!o.lines.empty()) noteList("Results from extraction:", o.lines);
   if (o.writeStatus != allOK) show_error(o.writeStatus, "Couldn't write the adjustments file " + adjustmentsFilePath());
   if (o.recomputeStatus != allOK) show_error(o.recomputeStatus, "Couldn't summarize information");
-}
-
-// ---- the hand-over from start-up
-
-namespace {
-
-XtSignalId gTermSignal = 0;
-
-// Toolkit warnings that say nothing a user can act on are not shown.
-const char* const kFilteredMessages[] = {"*invalid size*", "*specified location is invalid*"};
-
-bool filteredMessage(const char* message) {
-  for (const char* pattern : kFilteredMessages) {
-    if (fnmatch(pattern, message ? message : "", 0) == 0) return true;
-  }
-  return false;
-}
-
-XtErrorHandler gPreviousWarningHandler = nullptr;
-
-void filteringWarningHandler(String message) {
-  if (filteredMessage(message)) return;
-  if (gPreviousWarningHandler != nullptr) gPreviousWarningHandler(message);
-}
-
-void termHandler(int) {
-  if (gTermSignal != 0) XtNoticeSignal(gTermSignal);
-}
-
-}  // namespace
-
-ErrorCode runMainWindow(StartupState& state, StartupSummary& prepared) {
-  std::string error;
-  std::string programName = "kestrel";
-  char* argv[] = {programName.data(), nullptr};
-  int argc = 1;
-  // Start-up may have opened the toolkit already at its display step (taking the X options
-  // out of the command line then); otherwise it opens here on DISPLAY.
-  if (OI_Application::instance() == nullptr && !OI_Application::open(argc, argv, error)) {
-    reportError(displayNotOpened, "%s\n", error.c_str());
-    return displayNotOpened;
-  }
-  OI_Application* app = OI_Application::instance();
-  QR_OI_Init();
-  gPreviousWarningHandler = XtAppSetWarningHandler(app->context(), filteringWarningHandler);
-  // Java data take the Java wording of messages and labels.
-  if (state.isJava) mergeJavaResourceFiles(state.installDir);
-  if (XrmDatabase db = resourceDatabase()) {
-    app->installDatabase(db, true);
-    handOverResourceDatabase();
-  }
-  // A polite end on SIGTERM: the windows go down in order and the event loop returns.
-  gTermSignal = XtAppAddSignal(app->context(), [](XtPointer, XtSignalId*) { OI_Application::instance()->quit(); },
-                               nullptr);
-  struct sigaction sa {};
-  sa.sa_handler = termHandler;
-  sigemptyset(&sa.sa_mask);
-  struct sigaction old {};
-  sigaction(SIGTERM, &sa, &old);
-
-  // Source files are looked for along -userpath's directories, then ".".
-  const ViewerOption* userpath = findGivenOption("userpath", state.options);
-  initSourceSearchPath(userpath ? &userpath->value : nullptr);
-
-  ErrorCode result = allOK;
-  {
-    KG_SumFrame frame(state);
-    ErrorCode rc = frame.build(error);
-    if (rc != allOK) {
-      reportError(rc, "Couldn't construct viewer window:\n%s\n", error.c_str());
-      result = rc;
-    } else {
-      LockWaitCallback previous = setLockWaitCallback(windowLockReporter);
-      frame.showData(std::move(prepared.data), std::move(prepared.summary));
-      frame.show();
-      reportLoadResult(prepared.loadStatus, prepared.ignored);
-      if (!prepared.adjustmentProblems.empty()) noteList("Problems reading adjustments:", prepared.adjustmentProblems);
-      app->run();
-      setLockWaitCallback(previous);
-    }
-  }
-  sigaction(SIGTERM, &old, nullptr);
-  gTermSignal = 0;
-  OI_Application::close();
-  return result;
 }
