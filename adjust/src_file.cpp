@@ -36,31 +36,9 @@ bool readAll(FILE* f, std::string& out) {
   return !ferror(f);
 }
 
-void closeFile(FILE*& f) {
-  if (f) fclose(f);
-  f = nullptr;
-}
-
 }  // namespace
 
-SrcFile::~SrcFile() {
-  closeStreams();
-  dropTemporary();
-}
-
-void SrcFile::closeStreams() {
-  if (current_ != file_ && current_ != temp_ && current_ != writer_.stream()) closeFile(current_);
-  current_ = nullptr;
-  closeFile(file_);
-}
-
-void SrcFile::dropTemporary() {
-  closeFile(temp_);
-  if (!tempPath_.empty()) {
-    unlink(tempPath_.c_str());
-    tempPath_.clear();
-  }
-}
+SrcFile::~SrcFile() = default;
 
 SrcFile::Candidate SrcFile::tryCandidate(const std::string& path, std::uint32_t buildTime,
                                          SourcePrompter& prompter) {
@@ -92,7 +70,7 @@ SrcFile::Candidate SrcFile::tryCandidate(const std::string& path, std::uint32_t 
     close(fd);
     return Candidate::failed;
   }
-  file_ = f;
+  source_.reset(f);
   modTime_ = mtime;
   writable_ = access(path.c_str(), W_OK) == 0;
   fileCodeSet_ = codeSet;
@@ -125,8 +103,8 @@ ErrorCode SrcFile::openForReading(const std::string& requestedName, const std::s
   foundName_ = candidate;
   ErrorCode rc = prepareDisplay();
   if (rc != allOK) {
-    closeStreams();
-    dropTemporary();
+    source_.reset();
+    temp_.remove();
     return rc;
   }
   state_ = stateReading;
@@ -135,19 +113,17 @@ ErrorCode SrcFile::openForReading(const std::string& requestedName, const std::s
 
 ErrorCode SrcFile::prepareDisplay() {
   if (!codeSetNeedsConversion(fileCodeSet_)) {
-    current_ = file_;
     displayCodeSet_ = fileCodeSet_;
     return allOK;
   }
   std::string raw;
-  bool readOk = readAll(file_, raw);
+  bool readOk = readAll(source_.get(), raw);
   int readErr = errno;
-  closeFile(file_);
-  temp_ = createTemporaryFile("kgXRd", tempPath_);
-  if (!temp_) {
+  source_.reset();
+  if (!temp_.create("kgXRd")) {
     recordSystemError(errno, "Converting %s\ninto EUC in %s\nprior to display", foundName_.c_str(),
-                      tempPath_.c_str());
-    tempPath_.clear();
+                      temp_.path().c_str());
+    temp_.remove();
     return writeError;
   }
   std::string euc;
@@ -157,27 +133,28 @@ ErrorCode SrcFile::prepareDisplay() {
   } else if (!(fileCodeSet_ == codeSetShiftJis ? shiftJisToEuc(raw, euc)
                                                : jisToEuc(raw, euc, &asciiEscape_))) {
     err = EILSEQ;
-  } else if (fwrite(euc.data(), 1, euc.size(), temp_) != euc.size() || fflush(temp_) != 0) {
+  } else if (fwrite(euc.data(), 1, euc.size(), temp_.stream()) != euc.size() ||
+             fflush(temp_.stream()) != 0) {
     err = errno ? errno : EIO;
   }
   if (err) {
     recordSystemError(err, "Writing EUC version of %s\ninto %s\nprior to display",
-                      foundName_.c_str(), tempPath_.c_str());
-    dropTemporary();
+                      foundName_.c_str(), temp_.path().c_str());
+    temp_.remove();
     return fileWriteFailed;
   }
-  rewind(temp_);
-  current_ = temp_;
+  rewind(temp_.stream());
   displayCodeSet_ = codeSetEuc;
   return allOK;
 }
 
 bool SrcFile::readLine(std::string& line) {
   line.clear();
-  if (state_ != stateReading || !current_) return false;
+  FILE* in = readStream();
+  if (state_ != stateReading || !in) return false;
   char* buf = nullptr;
   size_t cap = 0;
-  ssize_t len = getline(&buf, &cap, current_);
+  ssize_t len = getline(&buf, &cap, in);
   if (len < 0) {
     free(buf);
     return false;
@@ -201,8 +178,8 @@ bool SrcFile::readLine(std::string& line) {
 
 void SrcFile::closeReading() {
   if (state_ != stateReading) return;
-  closeStreams();
-  dropTemporary();
+  source_.reset();
+  temp_.remove();
   state_ = stateClosed;
 }
 
@@ -223,35 +200,30 @@ ErrorCode SrcFile::openForWriting(const std::string& path, const std::string& pr
   }
   outputName_ = target;
   writeFailed_ = false;
-  if (codeSetNeedsConversion(fileCodeSet_)) {
-    temp_ = createTemporaryFile("kgXWr", tempPath_);
-    if (!temp_) {
-      int err = errno;
-      writer_.abandon();
-      recordSystemError(err, "Opening %s\nfor converting the display from EUC\nback to the proper format.",
-                        tempPath_.c_str());
-      tempPath_.clear();
-      return writeError;
-    }
-    current_ = temp_;
-  } else {
-    current_ = writer_.stream();
+  if (codeSetNeedsConversion(fileCodeSet_) && !temp_.create("kgXWr")) {
+    int err = errno;
+    writer_.abandon();
+    recordSystemError(err, "Opening %s\nfor converting the display from EUC\nback to the proper format.",
+                      temp_.path().c_str());
+    temp_.remove();
+    return writeError;
   }
   state_ = stateWriting;
   return allOK;
 }
 
 ErrorCode SrcFile::writeLine(const std::string& text) {
-  if (state_ != stateWriting || !current_) return fileWriteFailed;
-  std::string out;
+  FILE* out = writeStream();
+  if (state_ != stateWriting || !out) return fileWriteFailed;
+  std::string line;
   if (text == " ") {
-    out = "\n";
+    line = "\n";
   } else if (text.starts_with("^L")) {
-    out = "\f" + text.substr(2) + "\n";
+    line = "\f" + text.substr(2) + "\n";
   } else {
-    out = text + "\n";
+    line = text + "\n";
   }
-  if (fwrite(out.data(), 1, out.size(), current_) != out.size()) {
+  if (fwrite(line.data(), 1, line.size(), out) != line.size()) {
     writeFailed_ = true;
     recordSystemError(errno ? errno : EIO, "while writing into %s", outputName_.c_str());
     return fileWriteFailed;
@@ -265,11 +237,11 @@ ErrorCode SrcFile::finishWriting() {
   if (temp_) {
     std::string euc, converted;
     int err = 0;
-    if (fflush(temp_) != 0 || ferror(temp_)) {
+    if (fflush(temp_.stream()) != 0 || ferror(temp_.stream())) {
       err = errno ? errno : EIO;
     } else {
-      rewind(temp_);
-      if (!readAll(temp_, euc)) {
+      rewind(temp_.stream());
+      if (!readAll(temp_.stream(), euc)) {
         err = errno ? errno : EIO;
       } else if (!(fileCodeSet_ == codeSetShiftJis
                        ? eucToShiftJis(euc, converted)
@@ -281,19 +253,18 @@ ErrorCode SrcFile::finishWriting() {
       }
     }
     if (err) {
-      recordSystemError(err, "Translating from EUC (%s)\ninto destination %s.\n", tempPath_.c_str(),
+      recordSystemError(err, "Translating from EUC (%s)\ninto destination %s.\n", temp_.path().c_str(),
                         outputName_.c_str());
       rc = fileWriteFailed;
     } else if (writeFailed_) {
       recordSystemError(EIO, "while writing into %s", outputName_.c_str());
       rc = fileWriteFailed;
     }
-    dropTemporary();
+    temp_.remove();
   } else if (writeFailed_) {
     recordSystemError(EIO, "while writing into %s", outputName_.c_str());
     rc = fileWriteFailed;
   }
-  current_ = nullptr;
   if (rc == allOK) {
     rc = writer_.commit();
   } else {

@@ -4,11 +4,13 @@
 
 #include <cstdint>
 #include <cstdio>
+#include <memory>
 #include <string>
 
 #include "adjust/source_prompter.h"
 #include "support/atomic_write.h"
 #include "support/errors.h"
+#include "support/temp_file.h"
 
 class SrcFile {
  public:
@@ -41,7 +43,7 @@ class SrcFile {
   const std::string& requestedName() const { return requestedName_; }
   const std::string& foundName() const { return foundName_; }
   const std::string& outputName() const { return outputName_; }
-  const std::string& temporaryPath() const { return tempPath_; }
+  const std::string& temporaryPath() const { return temp_.path(); }
   std::uint32_t modificationTime() const { return modTime_; }
   bool writable() const { return writable_; }
   std::uint32_t displayCodeSet() const { return displayCodeSet_; }
@@ -52,17 +54,21 @@ class SrcFile {
   Candidate tryCandidate(const std::string& path, std::uint32_t buildTime,
                          SourcePrompter& prompter);
   ErrorCode prepareDisplay();
-  void dropTemporary();
-  void closeStreams();
+  // Where display lines come from (the file or its converted copy) and where written lines
+  // go (the new file or the copy converted back when writing ends).
+  FILE* readStream() const { return temp_ ? temp_.stream() : source_.get(); }
+  FILE* writeStream() const { return temp_ ? temp_.stream() : writer_.stream(); }
+
+  struct FileCloser {
+    void operator()(FILE* f) const { fclose(f); }
+  };
 
   std::uint32_t state_ = stateNew;
   std::string requestedName_;
   std::string foundName_;
-  std::string tempPath_;
   std::string outputName_;
-  FILE* current_ = nullptr;  // the file or the temporary copy; not owned separately
-  FILE* file_ = nullptr;
-  FILE* temp_ = nullptr;
+  std::unique_ptr<FILE, FileCloser> source_;  // the file as found, while it is read
+  TemporaryFile temp_;                         // the EUC form of a JIS or Shift-JIS file
   std::uint32_t modTime_ = 0;
   bool writable_ = false;
   std::uint32_t displayCodeSet_ = 1;

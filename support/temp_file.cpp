@@ -44,3 +44,18 @@ FILE* createTemporaryFile(const char* prefix, std::string& path) {
   }
   return f;
 }
+
+bool TemporaryFile::create(const char* prefix) {
+  remove();
+  stream_ = createTemporaryFile(prefix, path_);
+  return stream_ != nullptr;
+}
+
+void TemporaryFile::remove() {
+  if (stream_) {
+    fclose(stream_);
+    stream_ = nullptr;
+    unlink(path_.c_str());
+  }
+  path_.clear();
+}

@@ -13,3 +13,25 @@ void kgResetTempDirectory();
 // begins with the prefix, open for reading and writing. nullptr on failure (errno set;
 // path then holds the name pattern).
 FILE* createTemporaryFile(const char* prefix, std::string& path);
+
+// A temporary file made by createTemporaryFile, closed and removed when it goes.
+class TemporaryFile {
+ public:
+  TemporaryFile() = default;
+  ~TemporaryFile() { remove(); }
+  TemporaryFile(const TemporaryFile&) = delete;
+  TemporaryFile& operator=(const TemporaryFile&) = delete;
+
+  // Closes and removes any earlier one first. False with errno set; path() is then the
+  // name pattern that could not be created.
+  bool create(const char* prefix);
+  FILE* stream() const { return stream_; }
+  const std::string& path() const { return path_; }
+  explicit operator bool() const { return stream_ != nullptr; }
+  // Closes and removes the file; the path is forgotten.
+  void remove();
+
+ private:
+  FILE* stream_ = nullptr;
+  std::string path_;
+};
