@@ -79,8 +79,7 @@ OI_MultiText::~OI_MultiText() {
   flushJob_.cancel();
   while (!bars_.empty()) bars_.back()->detach(this, false);
   glyphs_.clear();
-  if (xftDraw_) XftDrawDestroy(xftDraw_);
-  xftDraw_ = nullptr;
+  xftDraw_.reset();  // before the buffer it draws into
   buffer_.reset();
   gc_.reset();
   colors_.reset();
@@ -90,8 +89,7 @@ OI_MultiText::~OI_MultiText() {
 void OI_MultiText::widgetDestroyed() {
   // The server objects belong to the display, which is still open; free them now.
   flushJob_.cancel();
-  if (xftDraw_) XftDrawDestroy(xftDraw_);
-  xftDraw_ = nullptr;
+  xftDraw_.reset();
   buffer_.reset();
 }
 
@@ -494,16 +492,15 @@ void OI_MultiText::ensureBuffer() {
   int bw = std::max<int>(1, width), bh = std::max(rows * cellHeight(), static_cast<int>(height));
   if (buffer_ && bw == bufW_ && bh == bufH_) return;
   Display* d = XtDisplay(w);
-  if (xftDraw_) XftDrawDestroy(xftDraw_);
-  xftDraw_ = nullptr;
+  xftDraw_.reset();
   buffer_ = OI_Pixmap(d, XCreatePixmap(d, XtWindow(w), static_cast<unsigned>(bw), static_cast<unsigned>(bh),
                                        DefaultDepthOfScreen(XtScreen(w))));
   bufW_ = bw;
   bufH_ = bh;
   if (!gc_) gc_ = OI_GC(d, buffer_.get());
   if (font_ && font_->isXft())
-    xftDraw_ = XftDrawCreate(d, buffer_.get(), DefaultVisualOfScreen(XtScreen(w)),
-                             DefaultColormapOfScreen(XtScreen(w)));
+    xftDraw_ = OI_XftDraw(d, buffer_.get(), DefaultVisualOfScreen(XtScreen(w)),
+                          DefaultColormapOfScreen(XtScreen(w)));
   allDirty_ = true;
 }
 
@@ -614,8 +611,8 @@ void OI_MultiText::drawRow(int row) {
       XFillRectangle(d, buffer_.get(), gc, x, y, width, static_cast<unsigned>(ch));
     }
     XSetForeground(d, gc, fg);
-    font_->drawCells(xftDraw_, colors_->get(fg), buffer_.get(), gc, x, y + font_->ascent(), text.data() + col,
-                     runEnd - col);
+    font_->drawCells(xftDraw_.get(), colors_->get(fg), buffer_.get(), gc, x, y + font_->ascent(),
+                     text.data() + col, runEnd - col);
     if (a.flags & OI_attrHeading) {
       XSetForeground(d, gc, fg);
       XDrawLine(d, buffer_.get(), gc, x, y + ch - 1, x + static_cast<int>(width) - 1, y + ch - 1);

@@ -211,7 +211,7 @@ class OI_MultiText : public OI_Widget {
   std::vector<unsigned long> colorTable_{0};
   OI_Pixmap buffer_;
   int bufW_ = 0, bufH_ = 0;
-  XftDraw* xftDraw_ = nullptr;
+  OI_XftDraw xftDraw_;  // draws into buffer_; declared after it, so it goes first
   OI_GC gc_;
 
   uint32_t top_ = 0;
