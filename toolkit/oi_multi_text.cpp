@@ -394,10 +394,9 @@ OI_Glyph* OI_MultiText::addGlyph(const std::string& name, uint32_t line, uint32_
   return raw;
 }
 
-OI_Glyph* OI_MultiText::addPixmapGlyph(const std::string& name, uint32_t line, uint32_t col, Pixmap image,
-                                       Pixmap mask, int width, int height) {
-  if (!widget() || image == None) return nullptr;
-  Display* d = XtDisplay(widget());
+OI_Glyph* OI_MultiText::addPixmapGlyph(const std::string& name, uint32_t line, uint32_t col, OI_Pixmap image,
+                                       OI_Pixmap mask, int width, int height) {
+  if (!widget() || !image) return nullptr;
   auto g = std::make_unique<OI_Glyph>();
   g->text_ = this;
   g->name_ = name;
@@ -405,8 +404,8 @@ OI_Glyph* OI_MultiText::addPixmapGlyph(const std::string& name, uint32_t line, u
   g->col_ = col;
   g->width_ = width;
   g->height_ = height;
-  g->image_ = OI_Pixmap(d, image);
-  if (mask != None) g->mask_ = OI_Pixmap(d, mask);
+  g->image_ = std::move(image);
+  g->mask_ = std::move(mask);
   g->isBitmap_ = false;
   OI_Glyph* raw = g.get();
   glyphs_.push_back(std::move(g));
