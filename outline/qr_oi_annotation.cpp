@@ -2,6 +2,7 @@
 #include "outline/qr_oi_annotation.h"
 
 #include <cstdlib>
+#include <utility>
 
 namespace {
 
@@ -74,14 +75,8 @@ QR_OI_Annotation::QR_OI_Annotation(XrmQuark name, Source source, std::vector<uns
                                    int height, std::vector<unsigned char> mask)
     : name_(name), source_(source), bits_(std::move(bits)), mask_(std::move(mask)), width_(width), height_(height) {}
 
-QR_OI_Annotation::~QR_OI_Annotation() {
-  if (pixmap_ != None && display_) XFreePixmap(display_, pixmap_);
-}
-
-void QR_OI_Annotation::setPixmap(Display* d, Pixmap p, int width, int height) {
-  if (pixmap_ != None && display_) XFreePixmap(display_, pixmap_);
-  display_ = d;
-  pixmap_ = p;
+void QR_OI_Annotation::setPixmap(OI_Pixmap p, int width, int height) {
+  pixmap_ = std::move(p);
   width_ = width;
   height_ = height;
 }

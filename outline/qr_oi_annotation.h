@@ -10,13 +10,13 @@
 #include <vector>
 
 #include "outline/qr_object.h"
+#include "toolkit/oi_x_resources.h"
 
 class QR_OI_Annotation : public QR_Object {
  public:
   enum Source { fromResource, fromBits, builtIn };
   QR_OI_Annotation(XrmQuark name, Source source, std::vector<unsigned char> bits, int width, int height,
                    std::vector<unsigned char> mask = {});
-  ~QR_OI_Annotation() override;
 
   XrmQuark name() const { return name_; }
   Source source() const { return source_; }
@@ -26,8 +26,8 @@ class QR_OI_Annotation : public QR_Object {
   int width() const { return width_; }
   int height() const { return height_; }
   // A pixmap of the window's depth taken from a resource file (the annotation keeps it).
-  Pixmap pixmap() const { return pixmap_; }
-  void setPixmap(Display* d, Pixmap p, int width, int height);
+  Pixmap pixmap() const { return pixmap_.get(); }
+  void setPixmap(OI_Pixmap p, int width, int height);
 
  private:
   XrmQuark name_;
@@ -35,8 +35,7 @@ class QR_OI_Annotation : public QR_Object {
   std::vector<unsigned char> bits_;
   std::vector<unsigned char> mask_;
   int width_, height_;
-  Display* display_ = nullptr;
-  Pixmap pixmap_ = None;
+  OI_Pixmap pixmap_;
 };
 
 // The built-in pictures, as X bitmap bits.

@@ -385,15 +385,16 @@ QR_OI_Annotation* QR_OI_OutlineDisplay::annotationImage(QR_OutlineAnnotation* a)
       unsigned pw, ph, border, depth;
       XGetGeometry(XtDisplay(w), p, &rootWin, &x, &y, &pw, &ph, &border, &depth);
       // A private copy, so that the cache of the toolkit can let its own go.
-      Pixmap copy = XCreatePixmap(XtDisplay(w), p, pw, ph, depth);
-      GC gc = XCreateGC(XtDisplay(w), copy, 0, nullptr);
-      XCopyArea(XtDisplay(w), p, copy, gc, 0, 0, pw, ph, 0, 0);
-      XFreeGC(XtDisplay(w), gc);
+      OI_Pixmap copy(XtDisplay(w), XCreatePixmap(XtDisplay(w), p, pw, ph, depth));
+      {
+        OI_GC gc(XtDisplay(w), copy.get());
+        XCopyArea(XtDisplay(w), p, copy.get(), gc.get(), 0, 0, pw, ph, 0, 0);
+      }
       XmDestroyPixmap(XtScreen(w), p);
       img = std::make_unique<QR_OI_Annotation>(a->name(), QR_OI_Annotation::fromResource,
                                                std::vector<unsigned char>{}, static_cast<int>(pw),
                                                static_cast<int>(ph));
-      img->setPixmap(XtDisplay(w), copy, static_cast<int>(pw), static_cast<int>(ph));
+      img->setPixmap(std::move(copy), static_cast<int>(pw), static_cast<int>(ph));
     }
   }
   // 2. The annotation's own bitmap.
@@ -423,30 +424,34 @@ OI_Glyph* QR_OI_OutlineDisplay::makeGlyph(QR_OutlineAnnotation* a, uint32_t line
   Widget w = text_->widget();
   if (img->source() == QR_OI_Annotation::fromResource) {
     Display* d = XtDisplay(w);
-    Pixmap copy = XCreatePixmap(d, img->pixmap(), static_cast<unsigned>(img->width()),
-                                static_cast<unsigned>(img->height()), DefaultDepthOfScreen(XtScreen(w)));
-    GC gc = XCreateGC(d, copy, 0, nullptr);
-    XCopyArea(d, img->pixmap(), copy, gc, 0, 0, static_cast<unsigned>(img->width()),
-              static_cast<unsigned>(img->height()), 0, 0);
-    XFreeGC(d, gc);
-    g = text_->addPixmapGlyph(name, line, col, copy, None, img->width(), img->height());
+    OI_Pixmap copy(d, XCreatePixmap(d, img->pixmap(), static_cast<unsigned>(img->width()),
+                                    static_cast<unsigned>(img->height()), DefaultDepthOfScreen(XtScreen(w))));
+    {
+      OI_GC gc(d, copy.get());
+      XCopyArea(d, img->pixmap(), copy.get(), gc.get(), 0, 0, static_cast<unsigned>(img->width()),
+                static_cast<unsigned>(img->height()), 0, 0);
+    }
+    g = text_->addPixmapGlyph(name, line, col, std::move(copy), OI_Pixmap(), img->width(), img->height());
   } else if (!img->mask().empty()) {
     // The arrow: its outline in the text colour over the filled shape in the highlight colour.
     Display* d = XtDisplay(w);
     Window rootWin = RootWindowOfScreen(XtScreen(w));
     unsigned iw = static_cast<unsigned>(img->width()), ih = static_cast<unsigned>(img->height());
-    Pixmap image = XCreatePixmap(d, rootWin, iw, ih, DefaultDepthOfScreen(XtScreen(w)));
-    Pixmap mask = XCreateBitmapFromData(d, rootWin, reinterpret_cast<const char*>(img->mask().data()), iw, ih);
-    Pixmap outline = XCreateBitmapFromData(d, rootWin, reinterpret_cast<const char*>(img->bits().data()), iw, ih);
-    GC gc = XCreateGC(d, image, 0, nullptr);
-    XSetForeground(d, gc, text_->highlightColor());
-    XFillRectangle(d, image, gc, 0, 0, iw, ih);
-    XSetForeground(d, gc, text_->foreground());
-    XSetClipMask(d, gc, outline);
-    XFillRectangle(d, image, gc, 0, 0, iw, ih);
-    XFreeGC(d, gc);
-    XFreePixmap(d, outline);
-    g = text_->addPixmapGlyph(name, line, col, image, mask, img->width(), img->height());
+    OI_Pixmap image(d, XCreatePixmap(d, rootWin, iw, ih, DefaultDepthOfScreen(XtScreen(w))));
+    OI_Pixmap mask(
+        d, XCreateBitmapFromData(d, rootWin, reinterpret_cast<const char*>(img->mask().data()), iw, ih));
+    {  // the outline and the GC serve only the drawing
+      OI_Pixmap outline(
+          d, XCreateBitmapFromData(d, rootWin, reinterpret_cast<const char*>(img->bits().data()), iw, ih));
+      OI_GC gc(d, image.get());
+      XSetForeground(d, gc.get(), text_->highlightColor());
+      XFillRectangle(d, image.get(), gc.get(), 0, 0, iw, ih);
+      XSetForeground(d, gc.get(), text_->foreground());
+      XSetClipMask(d, gc.get(), outline.get());
+      XFillRectangle(d, image.get(), gc.get(), 0, 0, iw, ih);
+    }
+    g = text_->addPixmapGlyph(name, line, col, std::move(image), std::move(mask), img->width(),
+                              img->height());
   } else {
     g = text_->addGlyph(name, line, col, img->bits().data(), img->width(), img->height());
   }

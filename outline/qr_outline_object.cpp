@@ -27,7 +27,7 @@ QR_OutlineRoot* QR_OutlineObject::root() {
 
 QR_OutlineDisplay* QR_OutlineObject::display() {
   QR_OutlineRoot* r = root();
-  return (r != nullptr && !r->tearing_down_) ? r->display_ : nullptr;
+  return (r != nullptr && !r->tearing_down_) ? r->display_.get() : nullptr;
 }
 
 QR_OutlineObject* QR_OutlineObject::parent_row() const { return as_row(parent()); }
@@ -354,7 +354,7 @@ void QR_OutlineObject::child_added(QR_FamilyObject* child) {
   }
   QR_OutlineRoot* r = root();
   if (r == nullptr || r->tearing_down_ || !c->is_displayed()) return;
-  QR_OutlineDisplay* d = r->display_;
+  QR_OutlineDisplay* d = r->display_.get();
   const std::uint32_t at = r->line_before(c);
   const std::uint32_t n = c->visible_line_count();
   if (n != 0) d->insert_lines(at, n);

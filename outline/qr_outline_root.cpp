@@ -34,8 +34,7 @@ QR_OutlineRoot::~QR_OutlineRoot() {
   selection_.clear();
   pending_ = nullptr;
   destroy_children();
-  delete display_;
-  display_ = nullptr;
+  display_.reset();  // after the rows, whose ends it hears of
   is_outline_root_ = false;
 }
 

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <cstdint>
+#include <memory>
 #include <vector>
 
 #include "outline/qr_outline_display.h"
@@ -32,7 +33,7 @@ class QR_OutlineRoot : public QR_OutlineObject {
   // Attaches and detaches the navigation and expansion tables of the selected rows.
   virtual void update_actions();
 
-  QR_OutlineDisplay* outline_display() const { return display_; }
+  QR_OutlineDisplay* outline_display() const { return display_.get(); }
 
   // The selection, in ascending line order.
   std::uint32_t selection_count() const { return selection_.count(); }
@@ -82,7 +83,7 @@ class QR_OutlineRoot : public QR_OutlineObject {
   bool precedes(QR_OutlineObject* a, QR_OutlineObject* b);
   void insert_into_selection(QR_OutlineObject* row);
 
-  QR_OutlineDisplay* display_;
+  std::unique_ptr<QR_OutlineDisplay> display_;
   QR_PointerArray<QR_OutlineObject> selection_;
   std::uint32_t root_flags_ = 0;
   std::vector<QR_OutlineObject*> line_map_;

@@ -49,9 +49,8 @@ std::map<std::pair<int, Widget>, OI_MessageDialog*>& dialogs() {
 }
 
 void dialogGone(Widget, XtPointer client, XtPointer) {
-  auto* key = static_cast<std::pair<int, Widget>*>(client);
+  std::unique_ptr<std::pair<int, Widget>> key(static_cast<std::pair<int, Widget>*>(client));
   dialogs().erase(*key);
-  delete key;
 }
 
 }  // namespace
@@ -72,7 +71,9 @@ void show_message(OI_Severity severity, const std::string& text, Widget parent) 
     DialogSpec s = specFor(severity);
     d = new OI_MessageDialog(p, s.name, s.title, severity);
     // The toolkit object is freed with its widget; the table forgets it then.
-    XtAddCallback(d->widget(), XmNdestroyCallback, dialogGone, new std::pair<int, Widget>(key));
+    // The callback's copy of the key is its own, freed when it runs.
+    auto gone = std::make_unique<std::pair<int, Widget>>(key);
+    XtAddCallback(d->widget(), XmNdestroyCallback, dialogGone, gone.release());
     OI_Widget* owner = OI_Widget::enclosing(p);
     if (owner != nullptr) {
       owner->own(std::unique_ptr<OI_MessageDialog>(d));

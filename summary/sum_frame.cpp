@@ -55,8 +55,7 @@ KG_SumFrame::KG_SumFrame(MainWindowInput& input) : input_(input) {}
 KG_SumFrame::~KG_SumFrame() {
   kgSummaryHooks() = KG_SummaryHooks{};
   // Rows and their display go before the widgets they draw into.
-  delete root_;
-  root_ = nullptr;
+  root_.reset();
   kgSetDialogHome(nullptr);
   window_.reset();
 }
@@ -128,7 +127,8 @@ ErrorCode KG_SumFrame::build(std::string& error) {
   outline_->text()->setColumns(static_cast<int>(width));
 
   buildPopup();
-  display_ = new QR_OI_OutlineDisplay(outline_);
+  auto display = std::make_unique<QR_OI_OutlineDisplay>(outline_);
+  display_ = display.get();
   if (OI_Menu* actions = window_->menuBar("kgTopMenu")->pulldown("kgActions")) {
     display_->add_controlled_widget(actions->widget());
   }
@@ -137,7 +137,7 @@ ErrorCode KG_SumFrame::build(std::string& error) {
     if (b->name() != "kgStartCRMS") display_->add_controlled_widget(b->widget());
   }
   if (OI_Button* crms = toolbar_->button("kgStartCRMS")) crms->setSensitive(!s.crmsCommandString.value.empty());
-  root_ = new KG_OutlineRoot(display_);
+  root_ = std::make_unique<KG_OutlineRoot>(display.release());  // the root owns the display
   placeHeadings();
   buildHelpMenu();
 

@@ -62,7 +62,7 @@ class KG_SumFrame {
 
   // Lines of the outline and of the headings as the user sees them.
   std::vector<std::string> heading_lines() const;
-  KG_OutlineRoot* root() const { return root_; }
+  KG_OutlineRoot* root() const { return root_.get(); }
   KG_SummaryOverall* overall() const;
   OI_TopLevel* window() const { return window_.get(); }
   Widget shell() const;
@@ -104,7 +104,7 @@ class KG_SumFrame {
   OI_Menu* stripeMenu_ = nullptr;
   OI_MenuCell* toolbarToggle_ = nullptr;
   QR_OI_OutlineDisplay* display_ = nullptr;  // owned by the root
-  KG_OutlineRoot* root_ = nullptr;
+  std::unique_ptr<KG_OutlineRoot> root_;
   bool busy_ = false;
   bool settingMenus_ = false;  // the program sets a menu: its callback does nothing
 };

@@ -79,8 +79,7 @@ OI_MultiText::~OI_MultiText() {
   flushJob_.cancel();
   while (!bars_.empty()) bars_.back()->detach(this, false);
   glyphs_.clear();
-  if (xftDraw_) XftDrawDestroy(xftDraw_);
-  xftDraw_ = nullptr;
+  xftDraw_.reset();  // before the buffer it draws into
   buffer_.reset();
   gc_.reset();
   colors_.reset();
@@ -90,8 +89,7 @@ OI_MultiText::~OI_MultiText() {
 void OI_MultiText::widgetDestroyed() {
   // The server objects belong to the display, which is still open; free them now.
   flushJob_.cancel();
-  if (xftDraw_) XftDrawDestroy(xftDraw_);
-  xftDraw_ = nullptr;
+  xftDraw_.reset();
   buffer_.reset();
 }
 
@@ -396,10 +394,9 @@ OI_Glyph* OI_MultiText::addGlyph(const std::string& name, uint32_t line, uint32_
   return raw;
 }
 
-OI_Glyph* OI_MultiText::addPixmapGlyph(const std::string& name, uint32_t line, uint32_t col, Pixmap image,
-                                       Pixmap mask, int width, int height) {
-  if (!widget() || image == None) return nullptr;
-  Display* d = XtDisplay(widget());
+OI_Glyph* OI_MultiText::addPixmapGlyph(const std::string& name, uint32_t line, uint32_t col, OI_Pixmap image,
+                                       OI_Pixmap mask, int width, int height) {
+  if (!widget() || !image) return nullptr;
   auto g = std::make_unique<OI_Glyph>();
   g->text_ = this;
   g->name_ = name;
@@ -407,8 +404,8 @@ OI_Glyph* OI_MultiText::addPixmapGlyph(const std::string& name, uint32_t line, u
   g->col_ = col;
   g->width_ = width;
   g->height_ = height;
-  g->image_ = OI_Pixmap(d, image);
-  if (mask != None) g->mask_ = OI_Pixmap(d, mask);
+  g->image_ = std::move(image);
+  g->mask_ = std::move(mask);
   g->isBitmap_ = false;
   OI_Glyph* raw = g.get();
   glyphs_.push_back(std::move(g));
@@ -494,16 +491,15 @@ void OI_MultiText::ensureBuffer() {
   int bw = std::max<int>(1, width), bh = std::max(rows * cellHeight(), static_cast<int>(height));
   if (buffer_ && bw == bufW_ && bh == bufH_) return;
   Display* d = XtDisplay(w);
-  if (xftDraw_) XftDrawDestroy(xftDraw_);
-  xftDraw_ = nullptr;
+  xftDraw_.reset();
   buffer_ = OI_Pixmap(d, XCreatePixmap(d, XtWindow(w), static_cast<unsigned>(bw), static_cast<unsigned>(bh),
                                        DefaultDepthOfScreen(XtScreen(w))));
   bufW_ = bw;
   bufH_ = bh;
   if (!gc_) gc_ = OI_GC(d, buffer_.get());
   if (font_ && font_->isXft())
-    xftDraw_ = XftDrawCreate(d, buffer_.get(), DefaultVisualOfScreen(XtScreen(w)),
-                             DefaultColormapOfScreen(XtScreen(w)));
+    xftDraw_ = OI_XftDraw(d, buffer_.get(), DefaultVisualOfScreen(XtScreen(w)),
+                          DefaultColormapOfScreen(XtScreen(w)));
   allDirty_ = true;
 }
 
@@ -614,8 +610,8 @@ void OI_MultiText::drawRow(int row) {
       XFillRectangle(d, buffer_.get(), gc, x, y, width, static_cast<unsigned>(ch));
     }
     XSetForeground(d, gc, fg);
-    font_->drawCells(xftDraw_, colors_->get(fg), buffer_.get(), gc, x, y + font_->ascent(), text.data() + col,
-                     runEnd - col);
+    font_->drawCells(xftDraw_.get(), colors_->get(fg), buffer_.get(), gc, x, y + font_->ascent(),
+                     text.data() + col, runEnd - col);
     if (a.flags & OI_attrHeading) {
       XSetForeground(d, gc, fg);
       XDrawLine(d, buffer_.get(), gc, x, y + ch - 1, x + static_cast<int>(width) - 1, y + ch - 1);

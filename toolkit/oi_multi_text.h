@@ -134,8 +134,8 @@ class OI_MultiText : public OI_Widget {
   OI_Glyph* addGlyph(const std::string& name, uint32_t line, uint32_t col, const unsigned char* bits, int width,
                      int height, const unsigned long* color = nullptr);
   // From a pixmap of the window's depth (taken over), with an optional depth-1 mask (taken over).
-  OI_Glyph* addPixmapGlyph(const std::string& name, uint32_t line, uint32_t col, Pixmap image, Pixmap mask,
-                           int width, int height);
+  OI_Glyph* addPixmapGlyph(const std::string& name, uint32_t line, uint32_t col, OI_Pixmap image,
+                           OI_Pixmap mask, int width, int height);
   void moveGlyph(OI_Glyph* glyph, uint32_t line, uint32_t col);
   void removeGlyph(OI_Glyph* glyph);
   OI_Glyph* glyphAt(int x, int y) const;
@@ -211,7 +211,7 @@ class OI_MultiText : public OI_Widget {
   std::vector<unsigned long> colorTable_{0};
   OI_Pixmap buffer_;
   int bufW_ = 0, bufH_ = 0;
-  XftDraw* xftDraw_ = nullptr;
+  OI_XftDraw xftDraw_;  // draws into buffer_; declared after it, so it goes first
   OI_GC gc_;
 
   uint32_t top_ = 0;

@@ -1,4 +1,4 @@
-// Owners of X server resources (GCs, pixmaps, cursors, Xft colours) that free them on destruction.
+// Owners of X server resources (GCs, pixmaps, cursors, Xft drawing contexts and colours) that free them.
 #pragma once
 
 #include <X11/Xft/Xft.h>
@@ -59,6 +59,31 @@ class OI_Pixmap {
  private:
   Display* d_ = nullptr;
   Pixmap p_ = None;
+};
+
+// An Xft drawing context. It must be destroyed before the drawable it draws into is freed.
+class OI_XftDraw {
+ public:
+  OI_XftDraw() = default;
+  OI_XftDraw(Display* d, Drawable where, Visual* v, Colormap cm) : draw_(XftDrawCreate(d, where, v, cm)) {}
+  ~OI_XftDraw() { reset(); }
+  OI_XftDraw(OI_XftDraw&& o) noexcept : draw_(std::exchange(o.draw_, nullptr)) {}
+  OI_XftDraw& operator=(OI_XftDraw&& o) noexcept {
+    if (this != &o) {
+      reset();
+      draw_ = std::exchange(o.draw_, nullptr);
+    }
+    return *this;
+  }
+  void reset() {
+    if (draw_) XftDrawDestroy(draw_);
+    draw_ = nullptr;
+  }
+  XftDraw* get() const { return draw_; }
+  explicit operator bool() const { return draw_ != nullptr; }
+
+ private:
+  XftDraw* draw_ = nullptr;
 };
 
 class OI_Cursor {
