@@ -38,6 +38,53 @@ bool readAll(FILE* f, std::string& out) {
 
 }  // namespace
 
+namespace {
+
+// The length of the well-formed UTF-8 character at the start of `s` (2 to 4 bytes), or 0.
+std::size_t utf8Length(std::string_view s) {
+  const auto b = [&](std::size_t i) { return static_cast<unsigned char>(s[i]); };
+  const auto cont = [&](std::size_t i) { return i < s.size() && (b(i) & 0xC0) == 0x80; };
+  const unsigned char c = b(0);
+  if (c >= 0xC2 && c <= 0xDF) return cont(1) ? 2 : 0;
+  if (c >= 0xE0 && c <= 0xEF) {
+    if (!cont(1) || !cont(2)) return 0;
+    if (c == 0xE0 && b(1) < 0xA0) return 0;   // overlong
+    if (c == 0xED && b(1) >= 0xA0) return 0;  // surrogates
+    return 3;
+  }
+  if (c >= 0xF0 && c <= 0xF4) {
+    if (!cont(1) || !cont(2) || !cont(3)) return 0;
+    if (c == 0xF0 && b(1) < 0x90) return 0;
+    if (c == 0xF4 && b(1) >= 0x90) return 0;  // above U+10FFFF
+    return 4;
+  }
+  return 0;
+}
+
+}  // namespace
+
+std::string sourceDisplayForm(std::string_view bytes, std::uint32_t displayCodeSet) {
+  if (bytes == "\f") return "^L";
+  if (bytes.empty()) return " ";
+  std::string out(bytes);
+  if (displayCodeSet != codeSetPlain) return out;
+  for (std::size_t i = 0; i < out.size();) {
+    const auto u = static_cast<unsigned char>(out[i]);
+    if (u == '\t' || u == '\r' || (u >= 0x20 && u < 0x7F)) {
+      ++i;
+      continue;
+    }
+    // Text in UTF-8 is shown as the characters it spells, except the C1 controls.
+    const std::size_t n = u >= 0x80 ? utf8Length(std::string_view(out).substr(i)) : 0;
+    if (n > 0 && !(u == 0xC2 && static_cast<unsigned char>(out[i + 1]) < 0xA0)) {
+      i += n;
+      continue;
+    }
+    out[i++] = '?';
+  }
+  return out;
+}
+
 SrcFile::~SrcFile() = default;
 
 SrcFile::Candidate SrcFile::tryCandidate(const std::string& path, std::uint32_t buildTime,
@@ -119,6 +166,17 @@ ErrorCode SrcFile::prepareDisplay() {
   std::string raw;
   bool readOk = readAll(source_.get(), raw);
   int readErr = errno;
+  std::string euc;
+  if (readOk && !(fileCodeSet_ == codeSetShiftJis ? shiftJisToEuc(raw, euc)
+                                                  : jisToEuc(raw, euc, &asciiEscape_))) {
+    // Bytes the detected code set cannot hold: the guess was wrong (Latin-1 letters and other
+    // stray bytes can look like Shift-JIS), so the file is shown and written as it is.
+    fileCodeSet_ = codeSetPlain;
+    displayCodeSet_ = codeSetPlain;
+    asciiEscape_.clear();
+    rewind(source_.get());
+    return allOK;
+  }
   source_.reset();
   if (!temp_.create("kgXRd")) {
     recordSystemError(errno, "Converting %s\ninto EUC in %s\nprior to display", foundName_.c_str(),
@@ -126,13 +184,9 @@ ErrorCode SrcFile::prepareDisplay() {
     temp_.remove();
     return writeError;
   }
-  std::string euc;
   int err = 0;
   if (!readOk) {
     err = readErr ? readErr : EIO;
-  } else if (!(fileCodeSet_ == codeSetShiftJis ? shiftJisToEuc(raw, euc)
-                                               : jisToEuc(raw, euc, &asciiEscape_))) {
-    err = EILSEQ;
   } else if (fwrite(euc.data(), 1, euc.size(), temp_.stream()) != euc.size() ||
              fflush(temp_.stream()) != 0) {
     err = errno ? errno : EIO;
@@ -149,7 +203,15 @@ ErrorCode SrcFile::prepareDisplay() {
 }
 
 bool SrcFile::readLine(std::string& line) {
-  line.clear();
+  bool ended = false;
+  if (!readRawLine(line, ended)) return false;
+  line = sourceDisplayForm(line, displayCodeSet_);
+  return true;
+}
+
+bool SrcFile::readRawLine(std::string& bytes, bool& ended) {
+  bytes.clear();
+  ended = false;
   FILE* in = readStream();
   if (state_ != stateReading || !in) return false;
   char* buf = nullptr;
@@ -159,19 +221,11 @@ bool SrcFile::readLine(std::string& line) {
     free(buf);
     return false;
   }
-  line.assign(buf, static_cast<size_t>(len));
+  bytes.assign(buf, static_cast<size_t>(len));
   free(buf);
-  if (!line.empty() && line.back() == '\n') line.pop_back();
-  if (line == "\f") {
-    line = "^L";
-  } else if (line.empty()) {
-    line = " ";
-  } else if (displayCodeSet_ == codeSetPlain) {
-    for (char& ch : line) {
-      auto u = static_cast<unsigned char>(ch);
-      if (u == '\t' || u == '\r') continue;
-      if (u >= 0x80 || u < 0x20 || u == 0x7F) ch = '?';
-    }
+  if (!bytes.empty() && bytes.back() == '\n') {
+    bytes.pop_back();
+    ended = true;
   }
   return true;
 }
@@ -224,6 +278,17 @@ ErrorCode SrcFile::writeLine(const std::string& text) {
     line = text + "\n";
   }
   if (fwrite(line.data(), 1, line.size(), out) != line.size()) {
+    writeFailed_ = true;
+    recordSystemError(errno ? errno : EIO, "while writing into %s", outputName_.c_str());
+    return fileWriteFailed;
+  }
+  return allOK;
+}
+
+ErrorCode SrcFile::writeBytes(const std::string& bytes) {
+  FILE* out = writeStream();
+  if (state_ != stateWriting || !out) return fileWriteFailed;
+  if (fwrite(bytes.data(), 1, bytes.size(), out) != bytes.size()) {
     writeFailed_ = true;
     recordSystemError(errno ? errno : EIO, "while writing into %s", outputName_.c_str());
     return fileWriteFailed;

@@ -6,11 +6,17 @@
 #include <cstdio>
 #include <memory>
 #include <string>
+#include <string_view>
 
 #include "adjust/source_prompter.h"
 #include "support/atomic_write.h"
 #include "support/errors.h"
 #include "support/temp_file.h"
+
+// The display form of a line's bytes: "^L" for a line that is a lone form feed, one blank for
+// an empty line; in the plain code set every byte that is neither printable, a tab, a carriage
+// return nor part of a well-formed UTF-8 character (C1 controls excepted) shows as "?".
+std::string sourceDisplayForm(std::string_view bytes, std::uint32_t displayCodeSet);
 
 class SrcFile {
  public:
@@ -28,6 +34,9 @@ class SrcFile {
                            std::uint32_t buildTime, SourcePrompter& prompter);
   // The next line in display form; false at end of file.
   bool readLine(std::string& line);
+  // The next line as its bytes (in the display code set), without its line end; `ended` tells
+  // whether a newline followed it. False at end of file.
+  bool readRawLine(std::string& bytes, bool& ended);
   void closeReading();
 
   // Starts writing to path (or to a path asked for with the prompt when pathGiven is false).
@@ -36,6 +45,8 @@ class SrcFile {
                            SourcePrompter& prompter);
   // One line in display form; written back in the file's own form.
   ErrorCode writeLine(const std::string& text);
+  // Bytes exactly as given (in the display code set), line ends included.
+  ErrorCode writeBytes(const std::string& bytes);
   // Converts back when needed and puts the new file in place.
   ErrorCode finishWriting();
 

@@ -14,7 +14,9 @@
 #include <vector>
 
 #include "adjust/code_set.h"
+#include "adjust/marker_comments.h"
 #include "adjust/source_search_path.h"
+#include "adjust/source_text.h"
 #include "adjust/src_file.h"
 #include "support/diagnostic.h"
 #include "support/temp_file.h"
@@ -335,6 +337,97 @@ TEST_F(SourceFiles, AnEditedLineThatShiftJisCannotHoldFailsTheWriteAndKeepsTheFi
   EXPECT_EQ(src.finishWriting(), fileWriteFailed);
   EXPECT_NE(pendingSystemError().find("Translating from EUC"), std::string::npos);
   EXPECT_EQ(readFile(path), sjis);
+  EXPECT_TRUE(temporaries().empty());
+}
+
+// What the window does: the text as its bytes, one marker edited, saved in place.
+std::string editOneLineAndSave(const std::string& path, std::size_t line, CvgAdjust kind,
+                               SourcePrompter& prompter, std::vector<std::string>* display = nullptr) {
+  SrcFile src;
+  SourceText text;
+  EXPECT_EQ(src.openForReading(path, kPrompt, 0, prompter), allOK);
+  EXPECT_EQ(text.read(src), allOK);
+  src.closeReading();
+  if (display) {
+    for (std::size_t n = 1; n <= text.lineCount(); ++n)
+      display->push_back(sourceDisplayForm(text.view(n), src.displayCodeSet()));
+  }
+  CvgAdjustSet set;
+  editAdjustmentLine(text, line, kind, set);
+  EXPECT_TRUE(text.edited(line));
+  EXPECT_EQ(src.openForWriting(path, "Write source to file:", true, prompter), allOK);
+  EXPECT_EQ(text.write(src), allOK);
+  EXPECT_EQ(src.finishWriting(), allOK);
+  return text.line(line);
+}
+
+TEST_F(SourceFiles, SavingAfterOneEditChangesOnlyThatLinesMarker) {
+  // UTF-8, Latin-1 bytes, a 20,000-byte line, CRLF ends, a form feed, a single blank, an empty
+  // line, a C1 control, and no newline at the end: all of it must come back as it was.
+  const std::string longLine = "static const char k[] = \"" + std::string(20000 - 27, 'x') + "\";";
+  ASSERT_EQ(longLine.size(), 20000u);
+  const std::vector<std::string> lines = {
+      "/* Gr\xc3\xbc\xc3\x9f dich, \xe2\x82\xac and \xf0\x9f\x98\x80 */",
+      "// Latin-1: caf\xe9 na\xefve",
+      longLine,
+      "int covered(void) {\r",
+      "  return 1;\r",
+      "}\r",
+      "\f",
+      " ",
+      "",
+      "// bell \x07 and C1 \xc2\x85 here",
+      "int last(void) { return 0; }",
+  };
+  std::string original;
+  for (std::size_t i = 0; i < lines.size(); ++i) original += lines[i] + (i + 1 < lines.size() ? "\n" : "");
+  const std::string path = dir.file("mixed.c");
+  writeFile(path, original);
+  ASSERT_EQ(chmod(path.c_str(), 0640), 0);
+  // "\xefv" looks like Shift-JIS, but the rest cannot be converted: the file opens as it is.
+  SrcFile probe;
+  ASSERT_EQ(probe.openForReading(path, kPrompt, 0, prompter), allOK);
+  EXPECT_EQ(probe.fileCodeSet(), codeSetPlain);
+  EXPECT_TRUE(temporaries().empty());
+  probe.closeReading();
+
+  std::vector<std::string> shown;
+  const std::string edited = editOneLineAndSave(path, 5, adjLineDead, prompter, &shown);
+  EXPECT_EQ(edited, "  return 1; /* kestrel: deadcode */");
+  std::string want;
+  for (std::size_t i = 0; i < lines.size(); ++i) {
+    want += i == 4 ? "  return 1; /* kestrel: deadcode */\r" : lines[i];
+    want += i + 1 < lines.size() ? "\n" : "";
+  }
+  EXPECT_EQ(readFile(path), want);
+  struct stat st;
+  ASSERT_EQ(stat(path.c_str(), &st), 0);
+  EXPECT_EQ(st.st_mode & 07777, 0640u);
+
+  // On screen: UTF-8 as its characters; Latin-1 bytes and controls as "?"; the whole long line.
+  ASSERT_EQ(shown.size(), lines.size());
+  EXPECT_EQ(shown[0], lines[0]);
+  EXPECT_EQ(shown[1], "// Latin-1: caf? na?ve");
+  EXPECT_EQ(shown[2], longLine);
+  EXPECT_EQ(shown[3], "int covered(void) {");
+  EXPECT_EQ(shown[6], "^L");
+  EXPECT_EQ(shown[7], " ");
+  EXPECT_EQ(shown[8], " ");
+  EXPECT_EQ(shown[9], "// bell ? and C1 ?? here");
+
+  // Taking the marker off again gives the file back exactly.
+  editOneLineAndSave(path, 5, 0, prompter);
+  EXPECT_EQ(readFile(path), original);
+  EXPECT_TRUE(temporaries().empty());
+}
+
+TEST_F(SourceFiles, AShiftJisFileEditedAsItsBytesComesBackUnchangedElsewhere) {
+  const std::string sjis = "/* \x93\xfa\x96\x7b\x8c\xea */\r\nint x; // \xb1\xb2\r\nint y;";
+  const std::string path = dir.file("jp.c");
+  writeFile(path, sjis);
+  editOneLineAndSave(path, 3, adjLineInspected, prompter);
+  EXPECT_EQ(readFile(path),
+            "/* \x93\xfa\x96\x7b\x8c\xea */\r\nint x; // \xb1\xb2\r\nint y; /* kestrel: inspected */");
   EXPECT_TRUE(temporaries().empty());
 }
 
