@@ -250,6 +250,28 @@ void OI_MultiText::clear() {
   contentChanged();
 }
 
+void OI_MultiText::setLineSupplier(const OI_LineSupplier* supplier) {
+  model_.setSupplier(supplier);
+  for (auto& g : glyphs_) g->line_ = OI_Glyph::noLine;
+  top_ = left_ = 0;
+  markAll();
+  contentChanged();
+}
+
+void OI_MultiText::linesChanged(uint32_t first, uint32_t last) {
+  model_.supplierChanged();
+  if (last < first) std::swap(first, last);
+  markRows(first, last);
+  contentChanged();
+}
+
+void OI_MultiText::allLinesChanged() {
+  model_.supplierChanged();
+  clampTop();
+  markAll();
+  contentChanged();
+}
+
 void OI_MultiText::contentChanged() {
   barsStale_ = true;
   scheduleFlush();

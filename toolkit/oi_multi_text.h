@@ -72,6 +72,13 @@ class OI_MultiText : public OI_Widget {
   void replaceTail(uint32_t line, uint32_t col, std::u32string_view text);
   void overwrite(uint32_t line, uint32_t col, const std::string& text);
   void clear();
+  // Lines from a supplier instead of stored ones (see OI_LineSupplier); null: none again. The
+  // supplier outlives its use here and says when its lines change.
+  void setLineSupplier(const OI_LineSupplier* supplier);
+  // The supplier's lines first..last (inclusive) look different now.
+  void linesChanged(uint32_t first, uint32_t last);
+  // The supplier now has another number of lines (or lines changed everywhere).
+  void allLinesChanged();
 
   // ---- Attributes. Colours are X pixels; flags are the OI_attr* bits.
   void setAttributes(uint32_t line, uint32_t col, uint32_t count, uint8_t flags, unsigned long fg = 0,
@@ -79,6 +86,8 @@ class OI_MultiText : public OI_Widget {
   void clearAttributes(uint32_t line);
   OI_CharAttr attrAt(uint32_t line, uint32_t col) const { return model_.attrAt(line, col); }
   unsigned long colorOf(uint16_t index) const;
+  // The index of a pixel in the colour table, for attributes a line supplier makes.
+  uint16_t colorIndexFor(unsigned long pixel) { return colorIndex(pixel); }
   // A colour name converted to a pixel; false in `ok` when it does not convert.
   unsigned long namedColor(const char* name, bool* ok = nullptr) const;
   unsigned long foreground() const { return fg_; }

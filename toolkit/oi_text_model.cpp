@@ -64,20 +64,35 @@ std::string oiEncodeUtf8(const std::u32string& text) {
   return out;
 }
 
-std::string OI_TextModel::lineText(uint32_t line) const {
-  return line < lines_.size() ? oiEncodeUtf8(lines_[line].text) : std::string();
+void OI_TextModel::setSupplier(const OI_LineSupplier* supplier) {
+  clear();
+  supplier_ = supplier;
+  cachedLine_ = kNoCache;
 }
+
+std::string OI_TextModel::lineText(uint32_t line) const { return oiEncodeUtf8(lineChars(line)); }
 
 const std::u32string& OI_TextModel::lineChars(uint32_t line) const {
   static const std::u32string empty;
+  if (supplier_) {
+    if (line >= supplier_->lineCount()) return empty;
+    if (cachedLine_ != line) {
+      cache_.clear();
+      supplier_->supplyLine(line, cache_);
+      cachedLine_ = line;
+    }
+    return cache_;
+  }
   return line < lines_.size() ? lines_[line].text : empty;
 }
 
 uint32_t OI_TextModel::lineLength(uint32_t line) const {
+  if (supplier_) return static_cast<uint32_t>(lineChars(line).size());
   return line < lines_.size() ? static_cast<uint32_t>(lines_[line].text.size()) : 0;
 }
 
 uint32_t OI_TextModel::maxLineLength() const {
+  if (supplier_) return supplier_->maxLineLength();
   if (maxLenStale_) {
     maxLen_ = 0;
     for (const auto& l : lines_) maxLen_ = std::max(maxLen_, static_cast<uint32_t>(l.text.size()));
@@ -95,7 +110,7 @@ void OI_TextModel::lengthMayShrink(uint32_t len) {
 }
 
 void OI_TextModel::insertLines(uint32_t before, const std::vector<std::string>& texts) {
-  if (texts.empty()) return;
+  if (texts.empty() || supplier_) return;
   before = std::min(before, lineCount());
   std::vector<Line> fresh(texts.size());
   for (size_t i = 0; i < texts.size(); ++i) {
@@ -108,7 +123,7 @@ void OI_TextModel::insertLines(uint32_t before, const std::vector<std::string>& 
 }
 
 uint32_t OI_TextModel::deleteLines(uint32_t first, uint32_t count) {
-  if (first >= lineCount()) return 0;
+  if (supplier_ || first >= lineCount()) return 0;
   count = std::min(count, lineCount() - first);
   for (uint32_t i = first; i < first + count; ++i) lengthMayShrink(lineLength(i));
   lines_.erase(lines_.begin() + first, lines_.begin() + first + count);
@@ -151,6 +166,11 @@ void OI_TextModel::clear() {
 }
 
 OI_CharAttr OI_TextModel::attrAt(uint32_t line, uint32_t col) const {
+  if (supplier_) {
+    std::vector<OI_CharAttr> attrs;
+    lineAttrs(line, attrs);
+    return col < attrs.size() ? attrs[col] : OI_CharAttr{};
+  }
   if (line >= lines_.size()) return {};
   for (const AttrRun& r : lines_[line].attrs) {
     if (col < r.col) break;
@@ -201,10 +221,21 @@ void OI_TextModel::clearAttributes(uint32_t line) {
   if (line < lines_.size()) lines_[line].attrs.clear();
 }
 
-bool OI_TextModel::hasAttributes(uint32_t line) const { return line < lines_.size() && !lines_[line].attrs.empty(); }
+bool OI_TextModel::hasAttributes(uint32_t line) const {
+  if (supplier_) {
+    std::vector<OI_CharAttr> attrs;
+    lineAttrs(line, attrs);
+    return !attrs.empty();
+  }
+  return line < lines_.size() && !lines_[line].attrs.empty();
+}
 
 void OI_TextModel::lineAttrs(uint32_t line, std::vector<OI_CharAttr>& out) const {
   out.clear();
+  if (supplier_) {
+    if (line < supplier_->lineCount()) supplier_->supplyAttrs(line, out);
+    return;
+  }
   if (line >= lines_.size() || lines_[line].attrs.empty()) return;
   const Line& l = lines_[line];
   out.resize(l.text.size());
@@ -229,7 +260,7 @@ std::string OI_TextModel::selectedText() const {
   if (!hasSelection()) return {};
   std::u32string out;
   for (uint32_t line = selStart_.line; line <= selEnd_.line && line < lineCount(); ++line) {
-    const std::u32string& t = lines_[line].text;
+    const std::u32string& t = lineChars(line);
     uint32_t from = line == selStart_.line ? selStart_.col : 0;
     uint32_t to = line == selEnd_.line ? selEnd_.col : UINT32_MAX;
     from = std::min<uint32_t>(from, static_cast<uint32_t>(t.size()));

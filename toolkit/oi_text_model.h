@@ -37,9 +37,32 @@ std::u32string oiDecodeUtf8(const std::string& text);
 void oiDecodeUtf8Append(std::string_view text, std::u32string& out);
 std::string oiEncodeUtf8(const std::u32string& text);
 
+// Lines that their owner makes when they are drawn or asked for, instead of the model keeping
+// them: a text of a quarter of a million lines then costs what is on screen. Attribute colours
+// are indices into the colour table of the text that draws them (OI_MultiText::colorIndexFor).
+class OI_LineSupplier {
+ public:
+  virtual ~OI_LineSupplier() = default;
+  virtual uint32_t lineCount() const = 0;
+  virtual void supplyLine(uint32_t line, std::u32string& chars) const = 0;
+  // One attribute per character, or nothing when the line is plain.
+  virtual void supplyAttrs(uint32_t /*line*/, std::vector<OI_CharAttr>& attrs) const { attrs.clear(); }
+  // The longest line's length in characters (at least that of every line).
+  virtual uint32_t maxLineLength() const = 0;
+};
+
 class OI_TextModel {
  public:
-  uint32_t lineCount() const { return static_cast<uint32_t>(lines_.size()); }
+  // Lines from the supplier from now on; the stored lines are dropped and changes to lines
+  // are ignored while a supplier is set. Null goes back to stored lines (none).
+  void setSupplier(const OI_LineSupplier* supplier);
+  const OI_LineSupplier* supplier() const { return supplier_; }
+  // The supplier's lines changed: nothing it supplied earlier is kept.
+  void supplierChanged() { cachedLine_ = kNoCache; }
+
+  uint32_t lineCount() const {
+    return supplier_ ? supplier_->lineCount() : static_cast<uint32_t>(lines_.size());
+  }
   std::string lineText(uint32_t line) const;  // empty past the end
   const std::u32string& lineChars(uint32_t line) const;
   uint32_t lineLength(uint32_t line) const;
@@ -96,6 +119,11 @@ class OI_TextModel {
   void lengthMayShrink(uint32_t len);
   void adjustSelectionForInsert(uint32_t before, uint32_t count);
   void adjustSelectionForDelete(uint32_t first, uint32_t count);
+
+  static constexpr uint32_t kNoCache = UINT32_MAX;
+  const OI_LineSupplier* supplier_ = nullptr;
+  mutable uint32_t cachedLine_ = kNoCache;  // the supplied line in cache_
+  mutable std::u32string cache_;
 
   std::vector<Line> lines_;
   mutable uint32_t maxLen_ = 0;

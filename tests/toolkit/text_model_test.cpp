@@ -116,6 +116,59 @@ TEST(TextModel, DoubleClickWordsStopAtPunctuation) {
   EXPECT_EQ(e.col - s.col, 1u);
 }
 
+// A quarter of a million numbered lines, made only when asked for; every seventh is marked.
+class NumberedLines : public OI_LineSupplier {
+ public:
+  mutable int made = 0;
+  uint32_t lineCount() const override { return 250000; }
+  void supplyLine(uint32_t line, std::u32string& chars) const override {
+    ++made;
+    for (char c : "line " + std::to_string(line)) chars.push_back(static_cast<unsigned char>(c));
+  }
+  void supplyAttrs(uint32_t line, std::vector<OI_CharAttr>& attrs) const override {
+    attrs.clear();
+    if (line % 7 == 0) attrs.assign(4, OI_CharAttr{OI_attrBackground, 0, 3});
+  }
+  uint32_t maxLineLength() const override { return 11; }
+};
+
+TEST(TextModel, SuppliedLinesAreMadeWhenAskedForAndNeverStored) {
+  NumberedLines lines;
+  OI_TextModel m;
+  m.insertLines(0, {"stored"});
+  m.setSupplier(&lines);
+  EXPECT_EQ(m.lineCount(), 250000u);
+  EXPECT_EQ(lines.made, 0);
+  EXPECT_EQ(m.lineText(123456), "line 123456");
+  EXPECT_EQ(m.lineLength(123456), 11u);  // the same line again comes from the cache
+  EXPECT_EQ(lines.made, 1);
+  EXPECT_EQ(m.lineText(250000), "");      // past the end
+  EXPECT_EQ(m.attrAt(14, 2).bg, 3u);
+  EXPECT_FALSE(m.hasAttributes(15));
+  EXPECT_EQ(m.maxLineLength(), 11u);
+  // Selections and words work on supplied text; stored-line changes are ignored, not applied.
+  m.setSelection({9, 5}, {10, 4});
+  EXPECT_EQ(m.selectedText(), "9\nline");
+  OI_TextPos a, b;
+  m.wordAround({20, 1}, a, b);
+  EXPECT_EQ(b.col - a.col, 4u);
+  m.insertLines(5, {"x"});
+  EXPECT_EQ(m.deleteLines(0, 10), 0u);
+  m.setLine(3, "y");
+  EXPECT_EQ(m.lineCount(), 250000u);
+  EXPECT_EQ(m.lineText(3), "line 3");
+  // A change the supplier reports is seen at the next look.
+  m.lineText(123456);
+  const int before = lines.made;
+  m.lineText(123456);
+  EXPECT_EQ(lines.made, before);
+  m.supplierChanged();
+  m.lineText(123456);
+  EXPECT_EQ(lines.made, before + 1);
+  m.setSupplier(nullptr);
+  EXPECT_EQ(m.lineCount(), 0u);
+}
+
 TEST(ToolkitText, AcceleratorResourcesBecomeKeysAndLabels) {
   std::string accel, text;
   ASSERT_TRUE(oiParseAccelerator("Ctrl<Key>O: fire()", accel, text));
