@@ -87,6 +87,20 @@ std::string sourceDisplayForm(std::string_view bytes, std::uint32_t displayCodeS
 
 SrcFile::~SrcFile() = default;
 
+std::unique_ptr<SrcFile> SrcFile::closedCopy() const {
+  auto copy = std::make_unique<SrcFile>();
+  copy->state_ = stateClosed;
+  copy->requestedName_ = requestedName_;
+  copy->foundName_ = foundName_;
+  copy->outputName_ = outputName_;
+  copy->modTime_ = modTime_;
+  copy->writable_ = writable_;
+  copy->displayCodeSet_ = displayCodeSet_;
+  copy->fileCodeSet_ = fileCodeSet_;
+  copy->asciiEscape_ = asciiEscape_;
+  return copy;
+}
+
 SrcFile::Candidate SrcFile::tryCandidate(const std::string& path, std::uint32_t buildTime,
                                          SourcePrompter& prompter) {
   if (path.empty()) return Candidate::failed;

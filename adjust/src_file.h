@@ -50,6 +50,10 @@ class SrcFile {
   // Converts back when needed and puts the new file in place.
   ErrorCode finishWriting();
 
+  // A copy of this file's description in the closed state (names, times, code sets), for a
+  // window that shows the same text and may write it out.
+  std::unique_ptr<SrcFile> closedCopy() const;
+
   std::uint32_t state() const { return state_; }
   const std::string& requestedName() const { return requestedName_; }
   const std::string& foundName() const { return foundName_; }
