@@ -230,6 +230,8 @@ struct ClassPass {
   }
 };
 
+}  // namespace
+
 // Both passes in one walk: actual (relevant = has code, good = used) and adjusted
 // (relevant = counts for adjusted coverage, good = adjusted used).
 void classifyLines(std::vector<LineState>& states) {
@@ -251,6 +253,8 @@ void classifyLines(std::vector<LineState>& states) {
                                     [](LineState& t, std::uint32_t c) { t.adjustedClass = c; });
   }
 }
+
+namespace {
 
 // Damaged line numbers are noted through `messages` when they are to be reported.
 void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,

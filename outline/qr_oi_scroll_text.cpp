@@ -37,7 +37,12 @@ QR_OI_ScrollTextGang::~QR_OI_ScrollTextGang() {
 
 QR_OI_ScrollText* QR_OI_ScrollTextGang::addText(const std::string& name, int col, int row, bool stretchX,
                                                 bool stretchY) {
-  QR_OI_ScrollText* t = own(std::make_unique<QR_OI_ScrollText>(widget(), name));
+  return addText(std::make_unique<QR_OI_ScrollText>(widget(), name), col, row, stretchX, stretchY);
+}
+
+QR_OI_ScrollText* QR_OI_ScrollTextGang::addText(std::unique_ptr<QR_OI_ScrollText> text, int col, int row,
+                                                bool stretchX, bool stretchY) {
+  QR_OI_ScrollText* t = own(std::move(text));
   place(t->widget(), 3 * col + 1, 3 * row + 1, stretchX, stretchY);
   texts_.push_back(t);
   return t;

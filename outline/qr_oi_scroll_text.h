@@ -24,6 +24,9 @@ class QR_OI_ScrollTextGang : public OI_GridBox {
 
   // A text in column `col` and row `row` of the gang: it sits at (3col+1, 3row+1).
   QR_OI_ScrollText* addText(const std::string& name, int col, int row, bool stretchX = true, bool stretchY = true);
+  // The same with a text of a derived kind, made by the caller with this gang's widget as parent.
+  QR_OI_ScrollText* addText(std::unique_ptr<QR_OI_ScrollText> text, int col, int row, bool stretchX = true,
+                            bool stretchY = true);
   // A bar shared by every text of the gang on that side, placed beside the text at (col, row);
   // it is named "QR_top_sb", "QR_bottom_sb", "QR_left_sb" or "QR_right_sb".
   OI_ScrollBar* addSharedBar(OI_Side side, int col, int row);

@@ -8,6 +8,7 @@
 #include "adjust/annotated_listing.h"
 #include "adjust/marker_comments.h"
 #include "coverage/adjustment_list.h"
+#include "coverage/summary_build.h"
 #include "settings/resource_table.h"
 
 namespace {
@@ -253,6 +254,9 @@ KG_DetailModel::LineEdit KG_DetailModel::editAdjustment(CvgAdjust kind, std::uin
   s.flags = (s.flags & ~adjLineMask) | kind;
   e.newKind = oneLineKind(s.flags);
   e.newDubious = kgDubiousAdjustment(s);
+  // The lines around it may change class with it (a stretch of unused lines broken by a line
+  // now counted as used): the classes are worked out again.
+  classifyLines(states_);
   if (!liveAdjustments_) {
     // The first edit since the text was loaded or saved: keep what to go back to.
     AdjustmentList& list = adjustmentList();

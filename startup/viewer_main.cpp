@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "source_view/kg_detail.h"
 #include "startup/console_report.h"
 #include "startup/startup.h"
 #include "summary/main_window.h"
@@ -55,6 +56,8 @@ ErrorCode showMainWindow(StartupState& s, StartupSummary& prepared) {
   input.loadStatus = prepared.loadStatus;
   input.ignored = std::move(prepared.ignored);
   input.adjustmentProblems = std::move(prepared.adjustmentProblems);
+  KG_DetailWindows sourceWindows;
+  input.sourceWindows = &sourceWindows;
   std::string failure;
   ErrorCode rc = runMainWindow(input, failure);
   if (rc != allOK && !failure.empty()) reportError(rc, "%s", failure.c_str());

@@ -7,6 +7,7 @@
 #include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
 #include "coverage/summary_sort.h"
+#include "outline/qr_outline_actions.h"
 #include "outline/qr_outline_display.h"
 #include "settings/kg_resource.h"
 #include "settings/resource_database.h"
@@ -52,6 +53,43 @@ std::string_view fitRight(const std::string& s, std::uint32_t width) {
   std::string_view v(s);
   if (v.size() <= width) return v;
   return v.substr(v.size() - width);
+}
+
+// The tables of the actions that open the annotated source, made once for every row.
+QR_CompiledActions* fileSourceActions() {
+  static const QR_ActionSpec specs[] = {
+      {KG_OpenDetailWindow, &QR_ActionCallWithArgument<KG_SummaryFile, &KG_SummaryFile::open_detail>},
+      {KG_ScrollToFunction, &QR_ActionCall<KG_SummaryFile, &KG_SummaryFile::scroll_to_function>},
+  };
+  static QR_CompiledActions* table = new QR_CompiledActions(specs, 2);
+  return table;
+}
+
+QR_CompiledActions* functionSourceActions() {
+  static const QR_ActionSpec specs[] = {
+      {KG_ScrollToFunction, &QR_ActionCall<KG_SummaryFunc, &KG_SummaryFunc::scroll_to_function>},
+      // A function row has no children: Return and space open its source instead.
+      {QR_OutlineExpandCollapse, &QR_ActionCall<KG_SummaryFunc, &KG_SummaryFunc::scroll_to_function>},
+  };
+  static QR_CompiledActions* table = new QR_CompiledActions(specs, 2);
+  return table;
+}
+
+// The glyph in front of a function row: a few indented lines of text, 11 x 11.
+const unsigned char* sourceGlyphBits() {
+  static const char* const picture[11] = {
+      "...........", ".#######...", "...........", "...######..", "...........", "...#######.",
+      "...........", ".#####.....", "...........", "...####....", "...........",
+  };
+  static unsigned char bits[22] = {};
+  static const bool made = [] {
+    for (int y = 0; y < 11; ++y)
+      for (int x = 0; x < 11; ++x)
+        if (picture[y][x] == '#') bits[y * 2 + x / 8] |= static_cast<unsigned char>(1u << (x % 8));
+    return true;
+  }();
+  (void)made;
+  return bits;
 }
 
 void adjustFuncCounts(std::uint32_t& deadFuncs, int deadDelta) {
@@ -341,6 +379,7 @@ ErrorCode KG_SummaryOverall::replace_data(std::unique_ptr<KgvData> data, Message
   if (r != nullptr) r->add_child(this);
   expand();
   restore_view_state();
+  if (hooks.summaryReplaced) hooks.summaryReplaced(*summary_);
   return allOK;
 }
 
@@ -381,6 +420,7 @@ void KG_SummaryDir::create_children() {
     auto* row = new KG_SummaryFile(f);
     row->give_first_line();
     if (!f->funcOrder.empty()) row->make_expandable();
+    if (f->lineCount != 0) row->attach_actions(fileSourceActions());
     add_child(row);
   }
   if (r != nullptr) r->release_updates(was);
@@ -425,7 +465,11 @@ void KG_SummaryFile::create_children() {
   for (SumFunc* f : file_->funcOrder) {
     auto* row = new KG_SummaryFunc(f, file_);
     row->give_first_line();
-    if (f->firstLine != 0) row->make_selectable();
+    if (f->firstLine != 0) {
+      row->make_selectable();
+      row->attach_actions(functionSourceActions());
+      row->put_annotation(KG_ScrollToFunction, 0, 0, sourceGlyphBits(), 11, 11);
+    }
     add_child(row);
   }
   if (r != nullptr) r->release_updates(was);
@@ -442,6 +486,13 @@ std::vector<KG_SummaryFunc*> KG_SummaryFile::functions_at_line(std::uint32_t lin
   }
   return out;
 }
+
+void KG_SummaryFile::open_detail(void* line) {
+  KG_SummaryHooks& hooks = kgSummaryHooks();
+  if (hooks.openSource) hooks.openSource(*file_, line != nullptr ? *static_cast<std::uint32_t*>(line) : 0);
+}
+
+void KG_SummaryFile::scroll_to_function() { open_detail(nullptr); }
 
 void KG_SummaryFile::count_adjustment_added(std::uint32_t kind, int deadFunctionDelta) {
   moveUnusedLine(file_->counts, 0, kind);
@@ -478,6 +529,15 @@ void KG_SummaryFunc::cell_text(std::uint32_t column, std::string& buffer, std::s
     }
   }
   place(buffer, position, width, column == 1 ? out : fitRight(out, width));
+}
+
+void KG_SummaryFunc::scroll_to_function() {
+  std::uint32_t line = func_->firstLine;
+  if (QR_OutlineObject* fileRow = parent_row()) {
+    fileRow->perform_action(KG_OpenDetailWindow, &line);
+  } else if (kgSummaryHooks().openSource) {
+    kgSummaryHooks().openSource(*file_, line);
+  }
 }
 
 void KG_SummaryFunc::adjustment_added(std::uint32_t kind) {

@@ -23,7 +23,15 @@ struct KG_SummaryHooks {
   std::function<void()> endBusy;
   // An error dialog: the message, then the error code's text.
   std::function<void(const std::string& message, ErrorCode code)> showError;
+  // Opens the annotated source window on a file at a line (0: its first line).
+  std::function<void(SumFile& file, std::uint32_t line)> openSource;
+  // The data were summarised anew: an annotated source window follows the new summary.
+  std::function<void(SumRoot& summary)> summaryReplaced;
 };
+
+// The actions by which rows open the annotated source window.
+inline constexpr const char* KG_OpenDetailWindow = "KG_OpenDetailWindow";
+inline constexpr const char* KG_ScrollToFunction = "KG_ScrollToFunction";
 KG_SummaryHooks& kgSummaryHooks();
 
 // A message text: the resource's value when the settings' database has one, else the default.
@@ -140,6 +148,10 @@ class KG_SummaryFile : public KG_OutlineText {
   std::uint32_t& view_state() override { return file_->viewState; }
   // The function rows whose line range holds the line (children are made when needed).
   std::vector<KG_SummaryFunc*> functions_at_line(std::uint32_t line);
+  // "KG_OpenDetailWindow" with the line (a std::uint32_t, or null for the first line), and
+  // "KG_ScrollToFunction" (the first line).
+  void open_detail(void* line);
+  void scroll_to_function();
   void count_adjustment_added(std::uint32_t kind, int deadFunctionDelta);
   void count_adjustment_removed(std::uint32_t kind, int deadFunctionDelta);
   SumFile* record() const { return file_; }
@@ -157,6 +169,9 @@ class KG_SummaryFunc : public KG_OutlineText {
                  std::uint32_t width) override;
   SumCounts& counts() override { return func_->counts; }
   std::uint32_t& view_state() override { return func_->viewState; }
+  // "KG_ScrollToFunction" (and Return or space on the row): the file's source at the
+  // function's first line.
+  void scroll_to_function();
   // One adjustment on an unused line of the function: its counts, its all-dead state, then the
   // same change in every ancestor with the dead-function change, and the lines redrawn.
   void adjustment_added(std::uint32_t kind);

@@ -85,6 +85,8 @@ ErrorCode runMainWindow(MainWindowInput& input, std::string& failure) {
       showLoadResult(input.loadStatus, input.ignored);
       if (!input.adjustmentProblems.empty()) noteList("Problems reading adjustments:", input.adjustmentProblems);
       app->run();
+      // The source windows go before the main window and the display they live on.
+      if (input.sourceWindows) input.sourceWindows->closeAll();
       setLockWaitCallback(previous);
     }
   }

@@ -12,6 +12,7 @@
 #include "coverage/kgv_file_ref.h"
 #include "coverage/kgv_merge.h"
 #include "coverage/summary_types.h"
+#include "summary/source_windows.h"
 #include "support/errors.h"
 
 // Everything the window needs from start-up; it owns the data from here on.
@@ -26,6 +27,7 @@ struct MainWindowInput {
   ErrorCode loadStatus = allOK;           // 1, or 36 when data were set aside
   std::vector<std::string> ignored;       // source files whose older data were set aside
   std::vector<std::string> adjustmentProblems;
+  KG_SourceWindows* sourceWindows = nullptr;  // the annotated source windows; not owned
 };
 
 // The toolkit opens the display (unless start-up opened it already) with the settings'

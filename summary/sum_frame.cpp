@@ -54,6 +54,10 @@ KG_SumFrame::KG_SumFrame(MainWindowInput& input) : input_(input) {}
 
 KG_SumFrame::~KG_SumFrame() {
   kgSummaryHooks() = KG_SummaryHooks{};
+  if (input_.sourceWindows) {
+    input_.sourceWindows->attachOutline(nullptr);
+    input_.sourceWindows->exitViewer = nullptr;
+  }
   // Rows and their display go before the widgets they draw into.
   root_.reset();
   kgSetDialogHome(nullptr);
@@ -155,6 +159,16 @@ ErrorCode KG_SumFrame::build(std::string& error) {
     end_busy();
   };
   hooks.showError = [](const std::string& m, ErrorCode code) { show_error(code, m); };
+  hooks.openSource = [this](SumFile& file, std::uint32_t line) {
+    if (input_.sourceWindows) input_.sourceWindows->open(file, line);
+  };
+  hooks.summaryReplaced = [this](SumRoot& summary) {
+    if (input_.sourceWindows) input_.sourceWindows->summaryReplaced(summary);
+  };
+  if (input_.sourceWindows) {
+    input_.sourceWindows->attachOutline(root_.get());
+    input_.sourceWindows->exitViewer = [this] { exit_viewer(); };
+  }
   return allOK;
 }
 
@@ -427,6 +441,9 @@ void KG_SumFrame::startChangeRequest() {
 }
 
 void KG_SumFrame::exit_viewer() {
+  // An annotated source window with unsaved edits asks first, and may keep the viewer open.
+  if (input_.sourceWindows && kgSettings().saveSourceAtExit.value && !input_.sourceWindows->confirmExit()) return;
+  if (input_.sourceWindows) input_.sourceWindows->closeAll();
   const std::string note = createUserDefaultsFromTemplate(input_.installDir);
   if (!note.empty()) show_message(OI_Severity::information, note);
   OI_Application::instance()->quit();

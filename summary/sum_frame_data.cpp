@@ -180,7 +180,8 @@ void KG_SumFrame::extract_adjustments() {
   {
     BusyScope busy(*this, nullptr);
     ConsoleMessages console;
-    o = extractAllAdjustments(all->summary(), "", question, console);
+    const std::string shown = input_.sourceWindows ? input_.sourceWindows->shownPath() : std::string();
+    o = extractAllAdjustments(all->summary(), shown, question, console);
   }
   if (!o.performed) return;
   all->refresh_subtree();

@@ -156,6 +156,8 @@ class OI_MultiText : public OI_Widget {
   // ---- Hooks
   // Button 3 outside a glyph (the window's popup menu).
   std::function<void(XEvent*)> onPopup;
+  // Button 1 outside a glyph, before any selection starts; true when the press was used up.
+  std::function<bool(XEvent*)> onPress;
   // The top line or left column changed.
   std::function<void()> onScroll;
   // More state for the test hook's dump from whoever draws into the text (one line, no newline).

@@ -24,6 +24,7 @@ void selectStartAction(Widget w, XEvent* ev, String*, Cardinal*) {
   oiGuard("select_start", [&] {
     t->takeFocus();
     if (t->dispatchGlyphPress(ev)) return;
+    if (t->onPress && t->onPress(ev)) return;
     t->startSelection(ev, t->countClick(ev));
   });
 }

@@ -76,6 +76,25 @@ void OI_TopLevel::setTitle(const std::string& title) {
   if (widget()) XtVaSetValues(widget(), XmNtitle, title.c_str(), nullptr);
 }
 
+void OI_TopLevel::setIconName(const std::string& name) {
+  if (widget()) XtVaSetValues(widget(), XmNiconName, name.c_str(), nullptr);
+}
+
+void OI_TopLevel::setIcon(const unsigned char* bits, int width, int height) {
+  Widget w = widget();
+  if (!w || !bits || width <= 0 || height <= 0) return;
+  Display* d = XtDisplay(w);
+  Pixmap p = XCreateBitmapFromData(d, RootWindowOfScreen(XtScreen(w)), reinterpret_cast<const char*>(bits),
+                                   static_cast<unsigned>(width), static_cast<unsigned>(height));
+  XtVaSetValues(w, XmNiconPixmap, p, nullptr);
+  icon_ = OI_Pixmap(d, p);  // the old one goes only after the shell stopped using it
+}
+
+void OI_TopLevel::raise() {
+  Widget w = widget();
+  if (w && XtIsRealized(w)) XRaiseWindow(XtDisplay(w), XtWindow(w));
+}
+
 void OI_TopLevel::setMinSize(int width, int height) {
   if (widget()) XtVaSetValues(widget(), XmNminWidth, width, XmNminHeight, height, nullptr);
 }

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "toolkit/oi_widget.h"
+#include "toolkit/oi_x_resources.h"
 
 class OI_MenuBar;
 
@@ -21,6 +22,12 @@ class OI_TopLevel : public OI_Widget {
   void setWorkArea(Widget w);
 
   void setTitle(const std::string& title);
+  // The name the window manager shows for the window's icon.
+  void setIconName(const std::string& name);
+  // The window's icon, from X bitmap bits.
+  void setIcon(const unsigned char* bits, int width, int height);
+  // In front of the other windows.
+  void raise();
   void setMinSize(int width, int height);
   void show();
   void hide();
@@ -46,6 +53,7 @@ class OI_TopLevel : public OI_Widget {
   Widget main_ = nullptr;
   OI_MenuBar* menuBar_ = nullptr;
   bool shown_ = false;
+  OI_Pixmap icon_;
   int lastW_ = 0, lastH_ = 0;
 };
 

@@ -188,6 +188,9 @@ TEST_F(DetailModel, ClicksSetAndTakeOffMarkersAndTheFileSavesExactly) {
   EXPECT_TRUE(m->modified());
   EXPECT_EQ(m->markerText(7), "  I  ");
   EXPECT_EQ(m->countCell(7), "INSP");
+  // The line counts as used now in the adjusted view, and is coloured so at once.
+  EXPECT_EQ(m->lineState(7)->adjustedClass, std::uint32_t(ClassUsed));
+  EXPECT_EQ(m->highlight(7), KG_LineHighlight::none);
   EXPECT_EQ(m->displayLine(8), "    return 0;");
   EXPECT_EQ(m->displayLine(7), "  if (x > 100) /* kestrel: inspected */");
   const CvgAdjustSet* set = adjustmentList().findSet(m->summaryPath());

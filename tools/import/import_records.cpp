@@ -60,8 +60,10 @@ std::unique_ptr<KgvData> makeImportedData(const ImportedData& data, std::uint32_
   auto d = std::make_unique<KgvData>();
   for (const auto& file : data.files) {
     LaidOutRecord rec = layOutRecord(file);
+    // The compiled version is the source as it was last written: a second later than that is
+    // the build, so that only a source changed since then counts as newer than its data.
     struct stat st;
-    std::uint32_t build = stat(file.path.c_str(), &st) == 0 ? static_cast<std::uint32_t>(st.st_mtime)
+    std::uint32_t build = stat(file.path.c_str(), &st) == 0 ? static_cast<std::uint32_t>(st.st_mtime) + 1
                                                              : importTime;
     d->records.push_back(makeImportedRecord(rec, build, importTime));
   }
