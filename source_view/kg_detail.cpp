@@ -188,6 +188,21 @@ void KG_FileDetail::buildPanes() {
   // One bar scrolls the four panes; only the source pane scrolls sideways.
   gang_->addSharedBar(OI_Side::right, 3, 1);
   adjust_->text()->onPress = [this](XEvent* ev) { return pressInAdjustments(ev); };
+  // For the test hook: each line's colouring as a letter (u used, n unused, d dead code,
+  // t tested, i inspected, - none), and the current line.
+  for (KG_SrcPane* p : {source_, counts_}) {
+    p->text()->describeMore = [this](std::ostream& out) {
+      static const char letters[] = "-undti";
+      out << " highlights=";
+      for (std::uint32_t i = 0; i < model_->lineCount() && i < 10000; ++i)
+        out << letters[static_cast<int>(model_->highlight(i))];
+    };
+  }
+  lineNumbers_->text()->describeMore = [this](std::ostream& out) { out << " current=" << lineNumbers_->currentLine(); };
+  adjust_->text()->describeMore = [this](std::ostream& out) {
+    out << " dubious=";
+    for (std::uint32_t i = 0; i < model_->lineStateCount() && i < 10000; ++i) out << (adjust_->markLine(i) ? 'x' : '-');
+  };
   for (KG_AnnotationPane* p : std::initializer_list<KG_AnnotationPane*>{lineNumbers_, counts_, source_})
     p->text()->onPress = [this, p](XEvent* ev) { return pressInPane(ev, *p); };
 }

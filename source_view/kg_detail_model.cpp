@@ -144,6 +144,16 @@ void KG_DetailModel::takeLineStates(const SumFile& file) {
   states_ = file.lineStates;
   fileName_ = file.name;
   dirName_ = file.dir != nullptr ? file.dir->name : "";
+  // The summary's lines carry the adjustments of when it was counted; edits not saved since
+  // are in the adjustment list only, and the window shows them.
+  const CvgAdjustSet* set = adjustmentList().findSet(summaryPath());
+  bool changed = false;
+  for (std::uint32_t i = 0; i < states_.size(); ++i) {
+    const std::uint32_t flags = (states_[i].flags & ~adjAnyMask) | (set ? set->lineKinds(i + 1) : 0);
+    changed = changed || flags != states_[i].flags;
+    states_[i].flags = flags;
+  }
+  if (changed) classifyLines(states_);
 }
 
 std::uint32_t KG_DetailModel::lineCount() const {

@@ -4,6 +4,7 @@
 #include <X11/IntrinsicP.h>
 #include <X11/CoreP.h>
 #include <X11/CompositeP.h>
+#include <X11/Shell.h>
 #include <Xm/Label.h>
 #include <Xm/List.h>
 #include <Xm/LabelG.h>
@@ -68,6 +69,11 @@ void describeWidget(Widget w, std::ostream& out, Display* d) {
     if (s) XmStringFree(s);
   }
   if (XmIsToggleButton(w) || XmIsToggleButtonGadget(w)) out << " set=" << (XmToggleButtonGetState(w) ? 1 : 0);
+  if (XtIsWMShell(w)) {
+    String title = nullptr, icon = nullptr;
+    XtVaGetValues(w, XtNtitle, &title, XtNiconName, &icon, nullptr);
+    out << " title=\"" << (title ? title : "") << "\" iconName=\"" << (icon ? icon : "") << "\"";
+  }
   if (XmIsList(w) && !OI_Widget::fromWidget(w)) {
     XmStringTable items = nullptr;
     int n = 0;

@@ -80,13 +80,19 @@ void GuiState::parse(const std::string& text) {
 }
 
 const WidgetInfo* GuiState::find(const std::string& name) const {
+  std::vector<const WidgetInfo*> all = findAll(name);
+  return all.empty() ? nullptr : all.front();
+}
+
+std::vector<const WidgetInfo*> GuiState::findAll(const std::string& name) const {
+  std::vector<const WidgetInfo*> out;
   for (const auto& w : widgets_) {
-    if (w.path == name) return &w;
-    if (w.path.size() > name.size() && w.path.compare(w.path.size() - name.size(), name.size(), name) == 0 &&
-        w.path[w.path.size() - name.size() - 1] == '.')
-      return &w;
+    if (w.path == name ||
+        (w.path.size() > name.size() && w.path.compare(w.path.size() - name.size(), name.size(), name) == 0 &&
+         w.path[w.path.size() - name.size() - 1] == '.'))
+      out.push_back(&w);
   }
-  return nullptr;
+  return out;
 }
 
 bool GuiState::viewable(const std::string& name) const {

@@ -30,6 +30,8 @@ class GuiState {
   void parse(const std::string& text);
   // The widget whose path ends with ".<name>" (or is <name>); null when there is none.
   const WidgetInfo* find(const std::string& name) const;
+  // Every widget so named, in the order of the windows (a second window of a kind comes later).
+  std::vector<const WidgetInfo*> findAll(const std::string& name) const;
   bool viewable(const std::string& name) const;
   const std::string& raw() const { return raw_; }
 
