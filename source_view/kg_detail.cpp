@@ -2,14 +2,17 @@
 #include "source_view/kg_detail.h"
 
 #include <X11/Xmu/CurUtil.h>
+#include <Xm/Xm.h>
 
 #include <algorithm>
+#include <map>
 
 #include "adjust/adjustments_file.h"
 #include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
 #include "outline/qr_oi_scroll_text.h"
 #include "settings/resource_table.h"
+#include "source_view/kg_navigation.h"
 #include "source_view/kg_panes.h"
 #include "summary/kg_outline_text.h"
 #include "summary/sum_dialogs.h"
@@ -25,6 +28,64 @@
 namespace {
 
 KG_DetailWindows* gKeeper = nullptr;
+
+// The windows by the texts of their panes, for the key action.
+std::map<Widget, KG_FileDetail*>& paneOwners() {
+  static std::map<Widget, KG_FileDetail*> owners;
+  return owners;
+}
+
+// The panes' keys. Everything not named here is swallowed, so typing never changes the text.
+const char kDetailTranslations[] =
+    "#override\n"
+    "<Key>R15: kg_detail_action(page_down)\n"
+    "<Key>R9: kg_detail_action(page_up)\n"
+    "<Key>osfPageDown: kg_detail_action(page_down)\n"
+    "<Key>osfPageUp: kg_detail_action(page_up)\n"
+    "Ctrl<Key>d: kg_detail_action(page_down)\n"
+    "Ctrl<Key>u: kg_detail_action(page_up)\n"
+    "Ctrl<Key>f: kg_detail_action(page_down)\n"
+    "Ctrl<Key>b: kg_detail_action(page_up)\n"
+    "Ctrl<Key>v: kg_detail_action(page_down)\n"
+    "Mod1<Key>v: kg_detail_action(page_up)\n"
+    "Ctrl<Key>c: copy_clipboard()\n"
+    "<Key>osfBeginLine: kg_detail_action(home)\n"
+    "<Key>osfDown: kg_detail_action(line_down)\n"
+    "<Key>osfUp: kg_detail_action(line_up)\n"
+    "<Key>R14: kg_detail_action(line_down)\n"
+    "<Key>R8: kg_detail_action(line_up)\n"
+    "<Key>j: kg_detail_action(line_down)\n"
+    "<Key>k: kg_detail_action(line_up)\n"
+    "<Key>n: kg_detail_action(next_unused)\n"
+    "<Key>p: kg_detail_action(prev_unused)\n"
+    "<Key>d: kg_detail_action(set_adjusts, deadcode)\n"
+    "<Key>i: kg_detail_action(set_adjusts, inspected)\n"
+    "<Key>t: kg_detail_action(set_adjusts, tested)\n"
+    "<Key>space: kg_detail_action(set_adjusts, none)\n"
+    "<Key>osfDelete: kg_detail_action(set_adjusts, none)\n"
+    "<Key>osfBackSpace: kg_detail_action(set_adjusts, none)\n"
+    "<Key>:\t\tkg_detail_action(KEY_UNDEF)\n";
+
+void detailAction(Widget w, XEvent*, String* params, Cardinal* count) {
+  auto it = paneOwners().find(w);
+  if (it == paneOwners().end() || count == nullptr || *count == 0) return;
+  KG_FileDetail* window = it->second;
+  const std::string name = params[0];
+  const std::string argument = *count > 1 ? params[1] : "";
+  oiGuard("kg_detail_action", [&] { window->action(name, argument); });
+}
+
+// The go-to field takes digits only.
+void digitsOnly(Widget, XtPointer, XtPointer call) {
+  auto* cb = static_cast<XmTextVerifyCallbackStruct*>(call);
+  if (!cb->text || !cb->text->ptr) return;
+  for (int i = 0; i < cb->text->length; ++i) {
+    if (cb->text->ptr[i] < '0' || cb->text->ptr[i] > '9') {
+      cb->doit = False;
+      return;
+    }
+  }
+}
 
 // The questions of the source-file code asked with the viewer's dialogs over the window.
 class WindowPrompter : public SourcePrompter {
@@ -91,6 +152,7 @@ KG_FileDetail::KG_FileDetail(bool snapshot, KG_OutlineRoot* outline)
     : model_(std::make_unique<KG_DetailModel>(snapshot)), outline_(outline) {}
 
 KG_FileDetail::~KG_FileDetail() {
+  std::erase_if(paneOwners(), [this](const auto& e) { return e.second == this; });
   // The panes draw from the model: they go first, with the window.
   window_.reset();
 }
@@ -205,6 +267,12 @@ void KG_FileDetail::buildPanes() {
   };
   for (KG_AnnotationPane* p : std::initializer_list<KG_AnnotationPane*>{lineNumbers_, counts_, source_})
     p->text()->onPress = [this, p](XEvent* ev) { return pressInPane(ev, *p); };
+  OI_Application* app = OI_Application::instance();
+  if (app->firstTime("kg_detail_action")) app->addAction("kg_detail_action", detailAction);
+  for (KG_AnnotationPane* p : std::initializer_list<KG_AnnotationPane*>{lineNumbers_, adjust_, counts_, source_}) {
+    paneOwners()[p->text()->widget()] = this;
+    p->text()->overrideTranslations(kDetailTranslations);
+  }
 }
 
 void KG_FileDetail::buildSearchBar() {
@@ -221,6 +289,11 @@ void KG_FileDetail::buildSearchBar() {
   for (OI_Widget* w : std::initializer_list<OI_Widget*>{next, prev, gotoLabel, gotoField, findLabel, findField})
     bar->place(w->widget(), col++, 0, w == findField, false);
   search_ = {next, prev, gotoField, findField};
+  next->onActivate = [this] { nextUnused(); };
+  prev->onActivate = [this] { previousUnused(); };
+  gotoField->onActivate = [this](const std::string& text) { goToTypedLine(text); };
+  findField->onActivate = [this](const std::string& text) { find(text); };
+  XtAddCallback(gotoField->widget(), XmNmodifyVerifyCallback, digitsOnly, nullptr);
 }
 
 void KG_FileDetail::show() {
@@ -519,6 +592,97 @@ std::uint32_t KG_FileDetail::referenceLine(int mode) const {
   if (mode == 1) return first - 1;
   if (mode == 3) return static_cast<std::uint32_t>(end);
   return static_cast<std::uint32_t>((end - 1 + first) / 2);
+}
+
+void KG_FileDetail::action(const std::string& name, const std::string& argument) {
+  const KG_View view{source_->firstVisibleLine(), source_->visibleLineCount()};
+  if (name == "set_adjusts") setAdjustments(argument);
+  else if (name == "next_unused") nextUnused();
+  else if (name == "prev_unused") previousUnused();
+  else if (name == "page_up") goToLine(kgPageUpTarget(view));
+  else if (name == "page_down") goToLine(kgPageDownTarget(view));
+  else if (name == "line_up") goToLine(kgLineUpTarget(referenceLine(3)));
+  else if (name == "line_down") goToLine(kgLineDownTarget(referenceLine(1)));
+  else if (name == "home") goToLine(1);
+}
+
+void KG_FileDetail::nextUnused() {
+  const std::uint32_t line = kgNextUnused(model_->lineStates(), referenceLine(1), model_->lineCount(),
+                                          kgSettings().stopAfterCodelessRegions.value);
+  if (line == 0) message("No unused lines below");
+  else goToLine(line);
+}
+
+void KG_FileDetail::previousUnused() {
+  const std::uint32_t line =
+      kgPreviousUnused(model_->lineStates(), referenceLine(3), kgSettings().stopAfterCodelessRegions.value);
+  if (line == 0) message("No unused lines above");
+  else goToLine(line);
+}
+
+void KG_FileDetail::goToTypedLine(const std::string& text) {
+  if (text.empty()) return;
+  // Digits only, but possibly very many of them.
+  std::uint64_t value = 0;
+  for (char c : text) {
+    if (c < '0' || c > '9') continue;
+    value = std::min<std::uint64_t>(value * 10 + static_cast<std::uint64_t>(c - '0'), 0xFFFFFFFFu);
+  }
+  const std::uint32_t line =
+      std::clamp<std::uint32_t>(static_cast<std::uint32_t>(value), 1, std::max<std::uint32_t>(1, model_->lineCount()));
+  goToLine(line);
+  search_.gotoLine->setText("");
+}
+
+void KG_FileDetail::find(const std::string& text) {
+  if (text.empty()) {
+    message("Enter pattern and hit <return>");
+    return;
+  }
+  for (std::uint32_t line = referenceLine(1) + 1; line <= model_->lineCount(); ++line) {
+    if (kgFindMatches(text, model_->displayLine(line - 1))) {
+      goToLine(line);
+      return;
+    }
+  }
+  message("Pattern not found before end-of-file");
+}
+
+void KG_FileDetail::setAdjustments(const std::string& kindWord) {
+  const KG_Settings& s = kgSettings();
+  if (model_->readOnly()) {
+    message(s.readOnlyWarningPrompt.value);
+    return;
+  }
+  if (!model_->showAdjusted()) {
+    message(s.actualCoverageShown.value);
+    return;
+  }
+  std::uint32_t first = 0, last = 0;
+  OI_MultiText* t = source_->text();
+  if (t->hasSelection()) {
+    first = t->selectionStart().line + 1;
+    last = t->selectionEnd().line + 1;
+    // A selection that ends before a line's first character does not take that line.
+    if (t->selectionEnd().col == 0 && last > first) --last;
+  } else if (const std::uint32_t current = lineNumbers_->currentLine();
+             current != 0 && current >= source_->firstVisibleLine() &&
+             current < source_->firstVisibleLine() + source_->visibleLineCount()) {
+    first = last = current;
+  } else {
+    message(s.noLinesSelectedPrompt.value);
+    return;
+  }
+  if (first > model_->lineStateCount()) {
+    message(s.noCodeTherePrompt.value);
+    return;
+  }
+  last = std::min(last, model_->lineStateCount());
+  CvgAdjust kind = 0;  // "none" and any other word
+  if (kindWord == "deadcode") kind = adjLineDead;
+  else if (kindWord == "tested") kind = adjLineTested;
+  else if (kindWord == "inspected") kind = adjLineInspected;
+  editAdjustments(kind, first, last);
 }
 
 // ---- KG_DetailWindows

@@ -66,6 +66,16 @@ class KG_FileDetail {
   // A message in the window's message line, with a short bell unless told otherwise.
   void message(const std::string& text, bool bell = true);
 
+  // The keys of the panes ("page_down", "set_adjusts" with "deadcode", ...), the buttons and
+  // fields of the search bar.
+  void action(const std::string& name, const std::string& argument);
+  void nextUnused();
+  void previousUnused();
+  void goToTypedLine(const std::string& text);
+  void find(const std::string& text);
+  // The selected lines of the source pane, or the current line when it is in view.
+  void setAdjustments(const std::string& kindWord);
+
   const KG_DetailModel& model() const { return *model_; }
   bool isSnapshot() const { return model_->isSnapshot(); }
   OI_TopLevel* window() const { return window_.get(); }

@@ -85,6 +85,7 @@ class KG_DetailModel {
   // Text lines: at least one, an empty text shows one blank line.
   std::uint32_t lineCount() const;
   std::uint32_t lineStateCount() const { return static_cast<std::uint32_t>(states_.size()); }
+  const std::vector<LineState>& lineStates() const { return states_; }
   const LineState* lineState(std::uint32_t index) const;
   std::string displayLine(std::uint32_t index) const;
   std::size_t longestDisplayLine() const;
