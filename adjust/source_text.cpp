@@ -29,6 +29,10 @@ ErrorCode SourceText::read(SrcFile& src) {
     std::string line;
     bool ended = false;
     while (src.readRawLine(line, ended)) append(line, ended ? endLf : endNone);
+    // The text stays as long as the window: no room kept for growth.
+    bytes_.shrink_to_fit();
+    starts_.shrink_to_fit();
+    ends_.shrink_to_fit();
   } catch (const std::bad_alloc&) {
     clear();
     return outOfMemory;

@@ -4,6 +4,8 @@
 #include <X11/Xmu/CurUtil.h>
 #include <Xm/Xm.h>
 
+#include <malloc.h>
+
 #include <algorithm>
 #include <map>
 
@@ -16,6 +18,7 @@
 #include "source_view/kg_panes.h"
 #include "summary/kg_outline_text.h"
 #include "summary/sum_dialogs.h"
+#include "summary/sum_timing.h"
 #include "support/message_sink.h"
 #include "toolkit/oi_controls.h"
 #include "toolkit/oi_dialogs.h"
@@ -317,6 +320,14 @@ void KG_FileDetail::show() {
   }
 }
 
+void KG_FileDetail::recordTiming(const std::string& what, double start) {
+  if (!kgTimingsWanted() || !shell()) return;
+  for (KG_AnnotationPane* p : std::initializer_list<KG_AnnotationPane*>{lineNumbers_, adjust_, counts_, source_})
+    p->text()->redisplay();
+  XSync(XtDisplay(shell()), False);
+  kgRecordTiming(what, kgNowMs() - start);
+}
+
 void KG_FileDetail::beginBusy(const char* text) {
   if (text) busy_->setLabel(text);
   gang_->unmanage();
@@ -426,10 +437,12 @@ void KG_FileDetail::toggleView(const std::string& item, bool on) {
   else if (item == "kgShowLineNumbers") numbers = on;
   else return;
   const bool recount = adjusted != model_->showAdjusted();
+  const double start = kgNowMs();
   beginBusy(nullptr);
   model_->setView(adjusted, counts, numbers, sw);
   applyView(recount);
   endBusy();
+  recordTiming("source toggle " + item, start);
   // New windows and the per-user defaults take the choice of the ordinary window only.
   if (!isSnapshot()) model_->storeViewInResources();
 }
@@ -595,6 +608,12 @@ std::uint32_t KG_FileDetail::referenceLine(int mode) const {
 }
 
 void KG_FileDetail::action(const std::string& name, const std::string& argument) {
+  const double start = kgNowMs();
+  actionWithoutTiming(name, argument);
+  recordTiming("source key " + name, start);
+}
+
+void KG_FileDetail::actionWithoutTiming(const std::string& name, const std::string& argument) {
   const KG_View view{source_->firstVisibleLine(), source_->visibleLineCount()};
   if (name == "set_adjusts") setAdjustments(argument);
   else if (name == "next_unused") nextUnused();
@@ -707,6 +726,13 @@ std::unique_ptr<KG_FileDetail> KG_DetailWindows::makeWindow(bool snapshot, std::
 }
 
 void KG_DetailWindows::open(SumFile& file, std::uint32_t line) {
+  const double start = kgNowMs();
+  // In use: small blocks of the arena and the large ones malloc maps on their own.
+  const auto heapInUse = [] {
+    const struct mallinfo2 m = mallinfo2();
+    return m.uordblks + m.hblkhd;
+  };
+  const std::size_t heapBefore = heapInUse();
   const bool made = current_ == nullptr;
   if (made) {
     std::string error;
@@ -728,6 +754,11 @@ void KG_DetailWindows::open(SumFile& file, std::uint32_t line) {
     return;
   }
   w.show();
+  if (kgTimingsWanted()) {
+    w.recordTiming("source open", start);
+    const std::size_t heapAfter = heapInUse();
+    kgRecordTiming("source open heap KB", heapAfter > heapBefore ? (heapAfter - heapBefore) / 1024.0 : 0.0);
+  }
 }
 
 void KG_DetailWindows::summaryReplaced(SumRoot& summary) {

@@ -76,6 +76,9 @@ class KG_FileDetail {
   // The selected lines of the source pane, or the current line when it is in view.
   void setAdjustments(const std::string& kindWord);
 
+  // For benchmarks (KG_TIMINGS): the time from `start` until what changed is drawn.
+  void recordTiming(const std::string& what, double start);
+
   const KG_DetailModel& model() const { return *model_; }
   bool isSnapshot() const { return model_->isSnapshot(); }
   OI_TopLevel* window() const { return window_.get(); }
@@ -93,6 +96,7 @@ class KG_FileDetail {
   void refreshTitle();
   void refreshAllLines();
   void setModified(bool on);
+  void actionWithoutTiming(const std::string& name, const std::string& argument);
   void beginBusy(const char* text);
   void endBusy();
   bool pressInAdjustments(XEvent* ev);

@@ -9,24 +9,9 @@ adjust=$3
 shot=${4:-$build/demo/viewer.png}
 here=$(cd "$(dirname "$0")" && pwd)
 
-# The viewer as start-up runs it; KG_DEMO_VIEWER names another command (the window's test
-# program runs the same hand-over while start-up does not reach it yet).
 viewer=("$build/bin/kestrel" -view)
-if [ -n "${KG_DEMO_VIEWER:-}" ]; then
-  read -r -a viewer <<<"$KG_DEMO_VIEWER"
-fi
-# When this build's start-up does not hand over to the window yet (its program does not hold
-# the window), the window's test program, which runs the same hand-over, stands in.
-choose_viewer() {
-  local probe="$build/tests/viewer_probe"
-  if [ -z "${KG_DEMO_VIEWER:-}" ] && [ -x "$probe" ] &&
-     ! grep -q "Couldn't construct viewer window" "$build/bin/kestrel-viewer" 2>/dev/null; then
-    viewer=("$probe")
-  fi
-}
 
 if [ -n "${DISPLAY:-}" ] && [ -z "${KG_DEMO_HEADLESS:-}" ]; then
-  choose_viewer
   echo "== The viewer (close its window or choose File > Exit to finish)"
   KESTREL_HOME="$build" "${viewer[@]}" "$adjust" "$kgv"
   exit $?
@@ -37,10 +22,11 @@ if [ -z "${KG_DEMO_INNER:-}" ]; then
 fi
 
 # Inside the private X server: start the viewer, wait for its window, open some rows.
-choose_viewer
 work=$(mktemp -d /tmp/kgdemo.XXXXXX)
 trap 'rm -rf "$work"' EXIT
 export KG_TIMINGS="$work/timings" KG_TEST_HOOK="$work/state" HOME="$work"
+# No window manager places the source window: it opens over the main window, shot before it.
+echo "Kestrelgauge*kgAnnotatedSource.geometry: +0+0" >"$work/.kestrel.Xdefaults"
 KESTREL_HOME="$build" "${viewer[@]}" "$adjust" "$kgv" 2>"$work/err" &
 pid=$!
 up=""
@@ -78,6 +64,26 @@ if [ -n "${ox:-}" ]; then
 fi
 mkdir -p "$(dirname "$shot")"
 xwd -root | convert xwd:- -trim +repage "$shot"
+echo "Screenshot of the viewer: $shot"
+
+# The first function of the file in the annotated source window, at its first line of code.
+source_shot="${shot%.png}-source.png"
+if [ -n "${ox:-}" ]; then
+  xdotool mousemove $((ox + 2 + 12 * 8)) $((oy + 17 * 2 + 8)) click 1
+  sleep 0.2
+  xdotool key Right Down Return
+  win=""
+  for _ in $(seq 50); do
+    win=$(state | grep '^kestrel.kgAnnotatedSource class=' | grep 'viewable=1' |
+      sed 's/.* geom=\([0-9]*\),\([0-9]*\),\([0-9]*\)x\([0-9]*\).*/\3x\4+\1+\2/')
+    [ -n "$win" ] && break
+    sleep 0.1
+  done
+  if [ -n "$win" ]; then
+    sleep 0.3
+    xwd -root | convert xwd:- -crop "$win" +repage "$source_shot"
+    echo "Screenshot of the annotated source: $source_shot"
+  fi
+fi
 kill "$pid" 2>/dev/null
 wait "$pid" 2>/dev/null
-echo "Screenshot of the viewer: $shot"
