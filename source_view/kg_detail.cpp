@@ -219,6 +219,11 @@ void KG_FileDetail::buildMenus() {
       if (!settingMenus_) toggleView(name, on);
     });
   }
+  OI_Menu* help = bar->addPulldown("kgHelpPulldown", "Help", "kgHelp");
+  help->addCell("kgProductInfo", "Product information", [this] {
+    if (versionText) show_message(OI_Severity::information, versionText(), shell());
+  });
+  bar->setHelpPulldown(help);
 }
 
 void KG_FileDetail::buildPanes() {
@@ -722,6 +727,7 @@ std::unique_ptr<KG_FileDetail> KG_DetailWindows::makeWindow(bool snapshot, std::
   w->onExit = [this] {
     if (exitViewer) exitViewer();
   };
+  w->versionText = [this] { return versionText; };
   return w;
 }
 
@@ -806,6 +812,7 @@ KG_FileDetail* KG_DetailWindows::adoptSnapshot(std::unique_ptr<KG_FileDetail> wi
   window->onExit = [this] {
     if (exitViewer) exitViewer();
   };
+  window->versionText = [this] { return versionText; };
   open_.push_back(std::move(window));
   return open_.back().get();
 }

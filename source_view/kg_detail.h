@@ -87,6 +87,7 @@ class KG_FileDetail {
   // Set by the keeper: the window asks to be closed (Close, the window manager) or to exit.
   std::function<void(KG_FileDetail&)> onClose;
   std::function<void()> onExit;
+  std::function<std::string()> versionText;
 
  private:
   void buildMenus();

@@ -30,4 +30,6 @@ class KG_SourceWindows {
 
   // "Exit Kestrelgauge" in a source window: the main window's exit, which the main window sets.
   std::function<void()> exitViewer;
+  // What Help > Product information shows in a source window, as in the main window.
+  std::string versionText;
 };

@@ -168,6 +168,7 @@ ErrorCode KG_SumFrame::build(std::string& error) {
   if (input_.sourceWindows) {
     input_.sourceWindows->attachOutline(root_.get());
     input_.sourceWindows->exitViewer = [this] { exit_viewer(); };
+    input_.sourceWindows->versionText = input_.versionText;
   }
   return allOK;
 }

@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include <algorithm>
+
 #include "adjust/adjustments_file.h"
 #include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
@@ -231,6 +233,30 @@ TEST_F(DetailModel, GivingEditsUpPutsTheSetOfBeforeBack) {
   ASSERT_NE(adjustmentList().findSet(plain->summaryPath()), nullptr);
   EXPECT_TRUE(plain->discardEdits());
   EXPECT_EQ(adjustmentList().findSet(plain->summaryPath()), nullptr);
+}
+
+TEST_F(DetailModel, TheAnnotatedListingHasEveryLineWithItsCount) {
+  auto m = open();
+  // The name the user gives in the file dialog.
+  class NamePrompter : public YesPrompter {
+   public:
+    explicit NamePrompter(std::string path) : path_(std::move(path)) {}
+    bool askFileName(const std::string&, std::string& name) override {
+      name = path_;
+      return true;
+    }
+
+   private:
+    std::string path_;
+  } naming(dir.file("listing.txt"));
+  ASSERT_EQ(m->writeAnnotated("Write annotated source to file:", naming), allOK);
+  const std::string listing = kgtest::readFile(dir.file("listing.txt"));
+  EXPECT_EQ(listing.substr(0, listing.find('\n')), "     |\tint helper(int x);");
+  EXPECT_NE(listing.find("10K+ |\t  return helper(a) - 2;\n"), std::string::npos) << listing;
+  EXPECT_NE(listing.find("DEAD |\t    return 0; /* kestrel: deadcode */\n"), std::string::npos) << listing;
+  EXPECT_EQ(std::count(listing.begin(), listing.end(), '\n'), 11);
+  // A cancelled dialog writes nothing and is no failure to report.
+  EXPECT_EQ(m->writeAnnotated("Write annotated source to file:", prompter), noFileName);
 }
 
 TEST_F(DetailModel, ViewsTitlesAndReadOnlyWindows) {

@@ -41,19 +41,26 @@ class SourceWindow : public ::testing::Test {
     // A source a minute older than its build, as after a real compile.
     struct timeval old[2] = {{time(nullptr) - 60, 0}, {time(nullptr) - 60, 0}};
     utimes(source.c_str(), old);
-    const std::string data = "record " + source + " build=" + std::to_string(time(nullptr)) +
-                             "\n"
-                             "function main line=3 calls=1\nblock 4 hits=1\nblock 5 hits=12345\n"
-                             "function helper line=7 calls=1\nblock 8 hits=1\nblock 9 hits=0\nblock 10 hits=1\n"
-                             "function unused_fn line=12 calls=0\nblock 13 hits=0\nblock 14 hits=0\n";
     // A second file, all used, so that it sorts after prog.c.
     other = dir.file("src/other.c");
     writeFile(other, "int other(void) {\n  return 7;\n}\n");
     utimes(other.c_str(), old);
-    const std::string more = "record " + other + " build=" + std::to_string(time(nullptr)) +
-                             "\nfunction other line=1 calls=3\nblock 2 hits=3\n";
+    makeData(1, true);
+  }
+  // The data of both files (prog.c only when asked), helper's line 8 run `hits` times.
+  void makeData(int hits, bool withProg) {
+    const std::string build = " build=" + std::to_string(time(nullptr)) + "\n";
+    std::string data;
+    if (withProg) {
+      data = "record " + source + build +
+             "function main line=3 calls=1\nblock 4 hits=1\nblock 5 hits=12345\n"
+             "function helper line=7 calls=1\nblock 8 hits=" + std::to_string(hits) +
+             "\nblock 9 hits=0\nblock 10 hits=1\n"
+             "function unused_fn line=12 calls=0\nblock 13 hits=0\nblock 14 hits=0\n";
+    }
+    data += "record " + other + build + "function other line=1 calls=3\nblock 2 hits=3\n";
     std::string error;
-    ASSERT_TRUE(makeKgvFile(data + more, dir.file("p.kgv"), error)) << error;
+    ASSERT_TRUE(makeKgvFile(data, dir.file("p.kgv"), error)) << error;
   }
   // `resources`: lines of the per-user defaults file.
   void start(const std::string& resources = {}) {
@@ -321,6 +328,27 @@ TEST_F(SourceWindow, SnapshotsAreReadOnlyCopiesAndCloseAndReopenWork) {
   ASSERT_TRUE(app->waitFor([this](const GuiState&) { return shells("kgAnnotatedSource") == 0; }, &last));
   clickOutline(outlineLine("main"), 9);
   ASSERT_TRUE(waitSourceAt(4));
+}
+
+TEST_F(SourceWindow, ReloadedDataReachTheWindowAndAFileNoLongerThereClosesIt) {
+  start();
+  clickOutline(outlineLine("helper"), 9);
+  ASSERT_TRUE(waitSourceAt(8)) << app->errorOutput();
+  EXPECT_EQ(last.find("kgCounts")->lines[7], "   1");
+  // New runs of the program: the counts change in the window, which stays where it was.
+  makeData(5, true);
+  clickWidget("kestrel.mainWindow.kgTopMenu.kgFilePulldown");
+  clickWidget("kgFile.kgReloadAll");
+  ASSERT_TRUE(app->waitFor([](const GuiState& s) { return s.find("kgCounts")->lines[7] == "   5"; }, &last))
+      << app->errorOutput();
+  EXPECT_EQ(last.find("kgLineNumbers")->number("current"), 8);
+  // Data without the file: the window goes and says why.
+  makeData(5, false);
+  clickWidget("kestrel.mainWindow.kgTopMenu.kgFilePulldown");
+  clickWidget("kgFile.kgReloadAll");
+  ASSERT_TRUE(app->waitViewable("kgWarningDialog", &last)) << app->errorOutput();
+  EXPECT_NE(last.raw().find("This file is no longer part of the .kgv data:"), std::string::npos);
+  EXPECT_EQ(shells("kgAnnotatedSource"), 0);
 }
 
 TEST_F(SourceWindow, ASourceThatCannotBeWrittenIsShownReadOnly) {

@@ -103,7 +103,7 @@ TEST_F(ViewerWindow, KeysClicksAndMenusOpenRowsWhileTheActionsFollowTheSelection
   ASSERT_TRUE(waitSensitive("toolbar.QR_OutlineNext", true));
   EXPECT_TRUE(last.find("kgExpandCollapseMenu.QR_OutlineExpandAll")->flag("sensitive"));
   EXPECT_FALSE(last.find("kgExpandCollapseMenu.QR_OutlineCollapse")->flag("sensitive"));
-  // The annotated source is not offered by any row yet.
+  // A directory row does not offer the annotated source (function rows do).
   EXPECT_FALSE(last.find("kgExpandCollapseMenu.KG_ScrollToFunction")->flag("sensitive"));
   app->key("Right");
   ASSERT_TRUE(waitLineCount(4 + 6)) << last.raw();
