@@ -12,6 +12,7 @@
 
 #include "outline/qr_oi_multi_text.h"
 #include "outline/qr_oi_outline_display.h"
+#include "outline/qr_outline_actions.h"
 #include "outline/qr_outline_object.h"
 #include "outline/qr_outline_root.h"
 #include "toolkit/oi_menu.h"
@@ -121,6 +122,19 @@ const char* QR_OI_OutlineDisplay::translations() {
 
 void QR_OI_OutlineDisplay::performActions(const std::vector<std::string>& actionStrings) {
   if (!root_) return;
+  // With nothing selected the moving keys have nowhere to move from: they select the first
+  // row in view, so that the outline can be used from the keyboard alone.
+  if (root_->selection_count() == 0 && actionStrings.size() == 1 &&
+      (actionStrings[0] == QR_OutlineNext || actionStrings[0] == QR_OutlinePrevious)) {
+    QR_OutlineObject* row = root_->object_at_line(text_->topLine());
+    while (row && !row->is_selectable()) row = row->next_row();
+    if (row) {
+      begin_update();
+      root_->select_exclusively(row);
+      end_update();
+    }
+    return;
+  }
   for (const std::string& a : actionStrings) {
     begin_update();
     root_->perform_action(a.c_str(), nullptr);

@@ -248,5 +248,43 @@ TEST_F(SourceKeys, SelectedLinesAreMarkedFromTheKeyboard) {
   EXPECT_EQ(app->state().find("kgSource")->lines[4], "  a++;");
 }
 
+TEST_F(SourceKeys, FromTheWorstFileToItsUnusedLinesByKeysAlone) {
+  writeFile(dir.file(".kestrel.Xdefaults"), "Kestrelgauge*kgAnnotatedSource.geometry: 570x540+700+0\n");
+  app = std::make_unique<GuiApp>(server,
+                                 std::vector<std::string>{buildDir() + "/bin/kestrel", "-view",
+                                                          "-adjustmentfilename=" + dir.file("adjust"), dir.file("n.kgv")},
+                                 std::vector<std::string>{"HOME=" + dir.path(), "KESTREL_HOME=" + buildDir()});
+  ASSERT_TRUE(app->waitFor([](const GuiState& s) { return s.find("kgOutline") && !s.find("kgOutline")->lines.empty(); },
+                           &last));
+  // Without a window manager the keyboard follows the pointer: it rests over each window in turn,
+  // as a window manager gives a new window the keyboard. Everything else is keys.
+  const WidgetInfo* outline = last.find("kgOutline");
+  app->moveTo(outline->x + outline->width / 2, outline->y + outline->height - 20);
+  // The rows are in the order of adjusted unused lines, the worst first.
+  for (const char* k : {"Down", "Down", "Right", "Down", "Right", "Down", "Return"}) app->key(k);
+  ASSERT_TRUE(app->waitFor([](const GuiState& s) { return s.viewable("kgLineNumbers"); }, &last))
+      << last.raw().substr(0, 1500);
+  const WidgetInfo* src = last.find("kgSource");
+  app->moveTo(src->x + src->width / 2, src->y + src->height / 2);
+  const int opened = last.find("kgLineNumbers")->number("current");
+  EXPECT_GT(opened, 0);
+  app->key("Home");
+  ASSERT_TRUE(waitCurrent(1));
+  std::vector<int> seen;
+  for (int i = 0; i < 4; ++i) {
+    app->key("n");
+    usleep(150 * 1000);
+    seen.push_back(app->state().find("kgLineNumbers")->number("current"));
+  }
+  EXPECT_EQ(seen, (std::vector<int>{4, 12, 44, 44}));
+  ASSERT_TRUE(waitMessage("No unused lines below"));
+  app->key("p");
+  ASSERT_TRUE(waitCurrent(12));
+  app->key("d");
+  ASSERT_TRUE(waitCurrent(13));
+  EXPECT_EQ(last.find("kgAdjustPane")->lines[11], "D    ");
+  EXPECT_EQ(last.find("kgCounts")->lines[11], "DEAD");
+}
+
 }  // namespace
 }  // namespace kgtest

@@ -233,8 +233,8 @@ TEST_F(SourceWindow, AClickMarksALineThatTheSummaryCountsAndSaveWritesOnlyThat) 
   clickOutline(outlineLine("unused_fn"), 9);
   ASSERT_TRUE(waitSourceAt(13)) << app->errorOutput();
   const auto adjCell = [&] {
-    last = app->state();
-    const std::string row = last.find("kgOutline")->lines[static_cast<size_t>(outlineLine("unused_fn"))];
+    const int at = outlineLine("unused_fn");  // reads the state into `last`
+    const std::string row = last.find("kgOutline")->lines[static_cast<size_t>(at)];
     return row.substr(row.find_last_not_of(' ') - 5);
   };
   const std::string before = adjCell();
