@@ -29,6 +29,9 @@ constexpr std::uint64_t kNumberGuard = 429496728;
 
 std::string gPath;
 bool gWritable = true;
+// Why the file on disk could not be read; while set the file is never rewritten, since the
+// list in memory lacks what the file holds.
+std::string gUnreadable;
 
 
 std::string homeOf(const char* user) {
@@ -245,26 +248,38 @@ std::string expandHomePath(const std::string& path) {
   return home.empty() ? path : home + rest;
 }
 
-void parseAdjustments(std::string_view text, const std::string& path, AdjustmentList& list,
+bool parseAdjustments(std::string_view text, const std::string& path, AdjustmentList& list,
                       std::vector<std::string>& warnings) {
-  if (!isPlainTextBytes(text.substr(0, 512))) {
+  // Files edited on other systems end their lines with CR LF; the CR is no part of a field.
+  std::string unixText;
+  if (text.find('\r') != std::string_view::npos) {
+    unixText.reserve(text.size());
+    for (size_t i = 0; i < text.size(); ++i) {
+      if (text[i] == '\r' && (i + 1 == text.size() || text[i + 1] == '\n')) continue;
+      unixText.push_back(text[i]);
+    }
+    text = unixText;
+  }
+  if (!isPlainTextOrUtf8Bytes(text.substr(0, 512), text.size() > 512)) {
     warnings.push_back(notTextWarning(path));
-    return;
+    return false;
   }
   if (text.substr(0, kBanner.size()) != kBanner) {
     warnings.push_back(stringPrintf("Line 1 of %s:\nthe file does not begin with the\nadjustments file "
                               "banner:\n   Kestrelgauge Adjustments File 1.0\nso it is not a "
                               "valid Kestrelgauge\nadjustments file.\n",
                               path.c_str()));
-    return;
+    return false;
   }
   RecordReader(text, path, list, warnings).run();
+  return true;
 }
 
 std::vector<std::string> readAdjustmentsFile(const std::string& givenPath) {
   std::vector<std::string> warnings;
   gPath = expandHomePath(givenPath);
   gWritable = true;
+  gUnreadable.clear();
   const std::string& path = gPath;
   struct stat st;
   if (stat(path.c_str(), &st) != 0) return warnings;  // no file yet: nothing to read
@@ -288,20 +303,27 @@ std::vector<std::string> readAdjustmentsFile(const std::string& givenPath) {
   }
   if (rc != allOK) {
     warnings.push_back(stringPrintf("%s:\nCould not open: %s", path.c_str(), errorMessage(rc).c_str()));
+    gUnreadable = "it could not be opened";
+    gWritable = false;
     return warnings;
   }
-  if (!isPlainText(fileno(f))) {
+  struct stat opened;
+  if (fstat(fileno(f), &opened) != 0 || !S_ISREG(opened.st_mode)) {
     warnings.push_back(notTextWarning(path));
+    gUnreadable = "it is not a plain text file";
   } else {
     std::string text;
     char buf[65536];
     size_t n;
     while ((n = fread(buf, 1, sizeof buf, f)) > 0) text.append(buf, n);
     // A read error ends the records where it happened; what was read so far stays.
-    parseAdjustments(text, path, adjustmentList(), warnings);
+    if (ferror(f)) gUnreadable = "reading it failed part way";
+    if (!parseAdjustments(text, path, adjustmentList(), warnings) && gUnreadable.empty())
+      gUnreadable = "it is not an adjustments file this program can read";
   }
   fclose(f);
   unlockAdjustmentsFile(path);
+  if (!gUnreadable.empty()) gWritable = false;
   return warnings;
 }
 
@@ -350,6 +372,12 @@ bool writeAdjustments(FILE* stream, const char* writerName, const AdjustmentList
 
 ErrorCode writeAdjustmentsFile() {
   const std::string& path = adjustmentsFilePath();
+  if (!gUnreadable.empty()) {
+    recordSystemError(0, "%s was not rewritten: %s, and rewriting it would lose the "
+                      "adjustments it holds.  Mend or move it, then try again.",
+                      path.c_str(), gUnreadable.c_str());
+    return fileWriteFailed;
+  }
   ErrorCode rc = lockAdjustmentsFile(path);
   if (rc != allOK) return rc;
   AtomicFileWriter writer;

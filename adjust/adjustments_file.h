@@ -22,15 +22,19 @@ std::string expandHomePath(const std::string& path);
 std::vector<std::string> readStartupAdjustments(const char* optionValue);
 
 // Reads the file (after "~" expansion, which becomes the stored path for writing) into the
-// process-wide list. A missing file is no problem; the result is the list of warnings.
+// process-wide list. A missing file is no problem; the result is the list of warnings. A
+// file that cannot be read as a whole (not opened, not text, no banner, a read error) is
+// never rewritten afterwards, and adjustmentsWritable() is false.
 std::vector<std::string> readAdjustmentsFile(const std::string& path);
 
-// The reader proper over the file's whole text; `path` names it in warnings.
-void parseAdjustments(std::string_view text, const std::string& path, AdjustmentList& list,
+// The reader proper over the file's whole text; `path` names it in warnings. False when the
+// text was refused as a whole (not text, or no banner).
+bool parseAdjustments(std::string_view text, const std::string& path, AdjustmentList& list,
                       std::vector<std::string>& warnings);
 
 // Writes the process-wide list to the stored path with the viewer's writer name. The file
-// is replaced only when everything was written; the result may be ignored.
+// is replaced only when everything was written; the result may be ignored. Refused
+// (fileWriteFailed, with the reason recorded) while the file read last could not be read.
 ErrorCode writeAdjustmentsFile();
 
 // The writer proper. No stream: nothing to do. False when a write failed.

@@ -24,6 +24,10 @@ bool codeSetNeedsConversion(std::uint32_t codeSet);
 // a regular file without NUL bytes in which more than nine bytes in ten are ordinary.
 bool isPlainText(int fd);
 bool isPlainTextBytes(std::string_view head);
+// The same test for files this program writes itself, whose text may name paths in any
+// script: bytes of valid UTF-8 count as ordinary. `truncated`: the head was cut from a
+// longer text, so a character cut off at its end is no fault.
+bool isPlainTextOrUtf8Bytes(std::string_view head, bool truncated);
 
 // The code set of an open file (its position is unchanged); codeSetNotText for anything that
 // is not a readable regular text file. Multi-byte text is allowed here, unlike isPlainText.

@@ -19,10 +19,13 @@ CvgAdjustSetPtr AdjustEntry::takeSet() {
 }
 
 int AdjustmentList::position(const std::string& path) const {
-  for (std::size_t i = 0; i < entries_.size(); ++i) {
-    if (entries_[i].resolvedName() == path) return static_cast<int>(i);
-  }
-  return -1;
+  auto it = index_.find(path);
+  return it == index_.end() ? -1 : static_cast<int>(it->second);
+}
+
+void AdjustmentList::reindex() {
+  index_.clear();
+  for (std::size_t i = 0; i < entries_.size(); ++i) index_.emplace(entries_[i].resolvedName(), i);
 }
 
 AdjustEntry* AdjustmentList::findEntry(const std::string& path) {
@@ -40,7 +43,10 @@ CvgAdjustSet* AdjustmentList::findSet(const std::string& dirName, const std::str
   return findSet(dirName + fileName);
 }
 
-void AdjustmentList::append(AdjustEntry entry) { entries_.push_back(std::move(entry)); }
+void AdjustmentList::append(AdjustEntry entry) {
+  index_.emplace(entry.resolvedName(), entries_.size());
+  entries_.push_back(std::move(entry));
+}
 
 bool AdjustmentList::storeSet(CvgAdjustSetPtr set, const std::string& path, std::uint32_t now) {
   AdjustEntry entry(makeKgvFileRef(path, path), std::move(set));
@@ -49,10 +55,10 @@ bool AdjustmentList::storeSet(CvgAdjustSetPtr set, const std::string& path, std:
   if (i >= 0) {
     AdjustEntry& old = entries_[static_cast<std::size_t>(i)];
     if (adjustSetsEqual(old.set(), entry.set())) return false;
-    old = std::move(entry);
+    old = std::move(entry);  // same resolved name: the index stays right
     return true;
   }
-  entries_.push_back(std::move(entry));
+  append(std::move(entry));
   return true;
 }
 
@@ -66,11 +72,12 @@ CvgAdjustSet* AdjustmentList::setForPath(const std::string& path, CvgAdjustSetPt
 void AdjustmentList::removeEntry(int pos) {
   if (pos < 0 || static_cast<std::size_t>(pos) >= entries_.size()) return;
   entries_.erase(entries_.begin() + pos);
+  reindex();
 }
 
 AdjustmentList AdjustmentList::merge(AdjustmentList old, AdjustmentList fresh) {
   for (AdjustEntry& e : old.entries_) {
-    if (fresh.position(e.resolvedName()) < 0) fresh.entries_.push_back(std::move(e));
+    if (fresh.position(e.resolvedName()) < 0) fresh.append(std::move(e));
   }
   return fresh;
 }

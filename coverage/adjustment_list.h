@@ -3,6 +3,7 @@
 
 #include <cstdint>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 #include "coverage/cvg_adjust_set.h"
@@ -53,14 +54,22 @@ class AdjustmentList {
   // one) when storing it changed the list, otherwise the one already stored.
   CvgAdjustSet* setForPath(const std::string& path, CvgAdjustSetPtr set, std::uint32_t now);
   void removeEntry(int position);
-  void clear() { entries_.clear(); }
+  void clear() {
+    entries_.clear();
+    index_.clear();
+  }
 
   // Entries of the old list whose names the new list lacks move to its end; the new list,
   // thus completed, is the result.
   static AdjustmentList merge(AdjustmentList old, AdjustmentList fresh);
 
  private:
+  void reindex();
+
   std::vector<AdjustEntry> entries_;
+  // Resolved name -> position of the first entry with it, so that reading a file of many
+  // entries stays linear.
+  std::unordered_map<std::string, std::size_t> index_;
 };
 
 // The list of the process.

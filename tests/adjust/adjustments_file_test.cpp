@@ -197,6 +197,92 @@ TEST_F(AdjustmentsFile, AWrongBannerOrABinaryFileIsRejectedAsAWhole) {
   EXPECT_EQ(read(kBanner.substr(0, 20)).size(), 1u);
 }
 
+TEST_F(AdjustmentsFile, PathsInAnyScriptReadBackAsWritten) {
+  // Long enough that nearly every byte of the head is non-ASCII: the test that lets binary
+  // data in must still tell it from text.
+  const std::vector<std::string> dirs = {
+      "\xe6\x97\xa5\xe6\x9c\xac\xe8\xaa\x9e\xe3\x81\xae\xe3\x83\x87\xe3\x82\xa3\xe3\x83\xac"
+      "\xe3\x82\xaf\xe3\x83\x88\xe3\x83\xaa\xe3\x81\xa7\xe3\x81\x99\xe3\x81\xad",  // Japanese
+      "\xd0\xba\xd0\xb0\xd1\x82\xd0\xb0\xd0\xbb\xd0\xbe\xd0\xb3\xd0\xb8\xd1\x81\xd1\x85\xd0"
+      "\xbe\xd0\xb4\xd0\xbd\xd0\xb8\xd0\xba\xd0\xbe\xd0\xb2",  // Cyrillic
+      "\xce\xba\xcf\x8e\xce\xb4\xce\xb9\xce\xba\xce\xb1\xcf\x82",  // Greek
+      "\xd8\xa7\xd9\x84\xd9\x85\xd8\xb5\xd8\xaf\xd8\xb1",  // Arabic
+      "\xf0\x9f\x90\xa6\xf0\x9f\x90\xa6\xf0\x9f\x90\xa6",  // outside the basic plane
+  };
+  std::vector<std::string> files;
+  for (size_t i = 0; i < dirs.size(); ++i) {
+    ASSERT_EQ(mkdir(dir.file(dirs[i]).c_str(), 0755), 0);
+    files.push_back(src(dirs[i] + "/" + dirs[(i + 1) % dirs.size()] + ".c"));
+    auto set = std::make_unique<CvgAdjustSet>();
+    set->addRange(adjLineDead, 1 + i, 3 + i);
+    set->addRange(adjRangeTested, 40, 50 + i);
+    adjustmentList().storeSet(std::move(set), files.back(), 1000 + i);
+  }
+  ASSERT_EQ(writeAdjustmentsFile(), allOK);
+  std::string first = readFile(path);
+
+  adjustmentList().clear();
+  EXPECT_EQ(readAdjustmentsFile(path), std::vector<std::string>{});
+  EXPECT_TRUE(adjustmentsWritable());
+  ASSERT_EQ(adjustmentList().size(), files.size());
+  for (size_t i = 0; i < files.size(); ++i) {
+    const AdjustEntry& e = adjustmentList().entries()[i];
+    EXPECT_EQ(e.resolvedName(), files[i]);
+    EXPECT_EQ(e.loadTime(), 1000 + i);
+    ASSERT_NE(e.set(), nullptr);
+    EXPECT_EQ(e.set()->lineKinds(2 + i), adjLineDead);
+    EXPECT_EQ(e.set()->lineKinds(50 + i), adjRangeTested);
+  }
+  // Written again, the file is the same except for the time in its header.
+  ASSERT_EQ(writeAdjustmentsFile(), allOK);
+  auto records = [](const std::string& t) { return t.substr(t.find("######\n", t.find("by "))); };
+  EXPECT_EQ(records(readFile(path)), records(first));
+}
+
+TEST_F(AdjustmentsFile, CarriageReturnLineEndsAreRead) {
+  std::string a = src("a.c");
+  std::string unixText = kBanner + "# notes\n" + a + "\t100\ttested\tL\t 5 3-4\n\n" + a +
+                         "\t100\tdeadcode\tB\t 20-30\n";
+  std::string dosText;
+  for (char c : unixText) {
+    if (c == '\n') dosText += '\r';
+    dosText += c;
+  }
+  EXPECT_EQ(read(dosText), std::vector<std::string>{});
+  std::vector<std::string> fromDos = writtenRecords();
+  adjustmentList().clear();
+  EXPECT_EQ(read(unixText), std::vector<std::string>{});
+  EXPECT_EQ(writtenRecords(), fromDos);
+  EXPECT_EQ(fromDos.size(), 2u);
+}
+
+TEST_F(AdjustmentsFile, AFileThatCouldNotBeReadIsNeverOverwritten) {
+  std::string a = src("a.c");
+  auto storeOne = [&] {
+    auto set = std::make_unique<CvgAdjustSet>();
+    set->addRange(adjLineDead, 3, 3);
+    adjustmentList().storeSet(std::move(set), a, 7);
+  };
+  const std::vector<std::string> unreadable = {
+      kBanner + std::string(600, '\xff') + "\n",            // not text
+      "Kestrelgauge Adjustments File 9.9\n/a.c\t1\ttested\tL\t1\n",  // another format
+  };
+  for (const std::string& body : unreadable) {
+    adjustmentList().clear();
+    EXPECT_EQ(read(body).size(), 1u);
+    EXPECT_FALSE(adjustmentsWritable());
+    storeOne();
+    EXPECT_EQ(writeAdjustmentsFile(), fileWriteFailed);
+    EXPECT_NE(errorMessage(fileWriteFailed).find(path + " was not rewritten"), std::string::npos);
+    EXPECT_EQ(readFile(path), body);
+  }
+  // Once a readable file was read, writing works again.
+  adjustmentList().clear();
+  EXPECT_TRUE(read(kBanner).empty());
+  storeOne();
+  EXPECT_EQ(writeAdjustmentsFile(), allOK);
+}
+
 TEST_F(AdjustmentsFile, AMissingFileIsNormalAndTheFirstStoreCreatesIt) {
   EXPECT_TRUE(readAdjustmentsFile(path).empty());
   EXPECT_TRUE(adjustmentsWritable());

@@ -1,6 +1,7 @@
 // kestrel -export and kestrel -extract as users run them from a shell: the report on
 // standard output, notes on standard error, the user's sort order, pipes closed early.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 
 #include "tests/coverage/kgv_test_util.h"
 
@@ -128,6 +129,51 @@ TEST(ExtractCommand, MarkersOfEverySourceFileGoToTheAdjustmentsFile) {
   // The next export shows the inspected line.
   r = runProcess({kestrel(), "-export", data}, home.env());
   EXPECT_NE(r.out.find("li\t2\tINSP\n"), std::string::npos);
+}
+
+TEST(ExtractCommand, AdjustmentsOfSourcesInNonAsciiFoldersSurviveTheNextExtraction) {
+  Home home;
+  // A Japanese folder name: most bytes near the start of the adjustments file are then
+  // multi-byte characters.
+  const std::string folder = home.dir.file(
+      "\xe6\x97\xa5\xe6\x9c\xac\xe8\xaa\x9e\xe3\x81\xae\xe3\x82\xbd\xe3\x83\xbc\xe3\x82\xb9"
+      "\xe3\x83\x95\xe3\x82\xa9\xe3\x83\xab\xe3\x83\x80\xe3\x83\xbc\xe3\x81\xa7\xe3\x81\x99");
+  ASSERT_EQ(mkdir(folder.c_str(), 0755), 0);
+  std::string jp = folder + "/\xe8\xa7\xa3\xe6\x9e\x90.c";
+  std::string other = home.dir.file("b.c");
+  kgtest::writeFile(jp, "int m() {\n  return 1; /* kestrel: tested */\n}\n");
+  kgtest::writeFile(other, "int n() {\n  return 2; /* kestrel: deadcode */\n}\n");
+  std::string first = kgtest::makeKgv(home.dir, "first.kgv",
+                                      "record \"" + jp + "\"\nfunction m line=1\nblock 2\n");
+  std::string second = kgtest::makeKgv(home.dir, "second.kgv",
+                                       "record " + other + "\nfunction n line=1\nblock 2\n");
+  auto r = runProcess({kestrel(), "-extract", first}, home.env());
+  ASSERT_EQ(r.status, 0) << r.err;
+  // The second extraction knows only the other file; the first one's marks must stay.
+  r = runProcess({kestrel(), "-extract", second}, home.env());
+  ASSERT_EQ(r.status, 0) << r.err;
+  EXPECT_EQ(r.err, "");
+  std::string adjust = kgtest::readFile(home.dir.file(".kestrel.adjust"));
+  EXPECT_NE(adjust.find(jp + "\t"), std::string::npos) << adjust;
+  EXPECT_NE(adjust.find(other + "\t"), std::string::npos) << adjust;
+  r = runProcess({kestrel(), "-export", first}, home.env());
+  ASSERT_EQ(r.status, 0) << r.err;
+  EXPECT_NE(r.out.find("li\t2\tTEST\n"), std::string::npos) << r.out;
+}
+
+TEST(ExtractCommand, AnAdjustmentsFileThatCannotBeReadIsLeftAsItIs) {
+  Home home;
+  std::string src = home.dir.file("m.c");
+  kgtest::writeFile(src, "int m() {\n  return 1; /* kestrel: inspected */\n}\n");
+  std::string data = kgtest::makeKgv(home.dir, "m.kgv", "record " + src + "\nfunction m line=1\nblock 2\n");
+  const std::string foreign = "Some other tool's notes\n/x.c 1 2 3\n";
+  kgtest::writeFile(home.dir.file(".kestrel.adjust"), foreign);
+  auto r = runProcess({kestrel(), "-extract", data}, home.env());
+  EXPECT_EQ(r.status, 21) << r.err;
+  EXPECT_NE(r.err.find("Couldn't write the adjustments file " + home.dir.file(".kestrel.adjust")),
+            std::string::npos) << r.err;
+  EXPECT_NE(r.err.find("was not rewritten"), std::string::npos) << r.err;
+  EXPECT_EQ(kgtest::readFile(home.dir.file(".kestrel.adjust")), foreign);
 }
 
 TEST(ViewCommand, TheWindowModeBuildsTheSummaryBeforeItsHandOver) {
