@@ -104,6 +104,33 @@ TEST(GcovJson, BadDocumentsNameTheLine) {
   EXPECT_EQ(e.text().rfind("e.json:1: not valid JSON", 0), 0u) << e.text();
 }
 
+// A data file ends names at a NUL, so a name holding one would name another file or
+// function, or none; the first input is the one the fuzzer found.
+TEST(GcovJson, NamesHoldingANulAreRefused) {
+  std::string found = kgtest::readFile(std::string(KG_SOURCE_DIR) +
+      "/fuzz/regressions/gcov_json_reader_fuzz/crash-f5b80d1e686694b3f5da7ee31033b8a2a0fe33e3");
+  ASSERT_NE(found.find("\\u0000"), std::string::npos);
+  ImportedData d;
+  ImportError e;
+  EXPECT_FALSE(readGcovJson("f.json", found, d, e));
+  EXPECT_EQ(e.text(), "f.json:1: a file name holds a NUL character");
+
+  EXPECT_FALSE(readGcovJson("g.json", R"j({"current_working_directory":"/b\u0000x","files":[{"file":"a.c"}]})j", d, e));
+  EXPECT_EQ(e.text(), "g.json:1: a file name holds a NUL character");
+  EXPECT_FALSE(readGcovJson("h.json",
+      R"j({"files":[{"file":"/s/a.c","functions":[{"name":"f\u0000x","start_line":1}]}]})j", d, e));
+  EXPECT_EQ(e.text(), "h.json:1: a function name of /s/a.c holds a NUL character");
+
+  // Other escapes are names like any other; a directory not used does not matter.
+  ImportedData ok;
+  ASSERT_TRUE(readGcovJson("i.json",
+      R"j({"current_working_directory":"/b\u0000x","files":[{"file":"/s/caf\u00e9.c",)j"
+      R"j("functions":[{"name":"g\tx","start_line":2}]}]})j", ok, e)) << e.text();
+  ASSERT_EQ(ok.files.size(), 1u);
+  EXPECT_EQ(ok.files[0].path, "/s/caf\xc3\xa9.c");
+  EXPECT_EQ(ok.files[0].functions.at(0).name, "g\tx");
+}
+
 TEST(Layout, LinesGoToTheInnermostFunctionAndTheRestToFileScope) {
   ImportedFile f;
   f.path = "/src/n.cc";

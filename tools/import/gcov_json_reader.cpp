@@ -108,7 +108,11 @@ struct Reader {
       auto path = f.find("file");
       if (path == f.end() || !path->is_string() || path->get<std::string>().empty())
         return fail(start, "a file entry has no \"file\" name");
-      ImportedFile& file = data.file(absolute(path->get<std::string>(), cwd));
+      // JSON may spell a NUL ("\u0000"), but the data file ends names there: a name cut
+      // short would stand for another file, or for none.
+      std::string full = absolute(path->get<std::string>(), cwd);
+      if (full.find('\0') != std::string::npos) return fail(start, "a file name holds a NUL character");
+      ImportedFile& file = data.file(full);
 
       auto funcs = f.find("functions");
       if (funcs != f.end()) {
@@ -124,6 +128,8 @@ struct Reader {
           std::uint64_t calls = 0;
           if (fname.empty() || !lineField(fn, "start_line", startLine))
             return fail(start, "a function of " + file.path + " has no name or start line");
+          if (fname.find('\0') != std::string::npos)
+            return fail(start, "a function name of " + file.path + " holds a NUL character");
           lineField(fn, "end_line", endLine);
           unsignedField(fn, "execution_count", calls);
           ImportedFunction& func = file.function(fname);
