@@ -3,7 +3,11 @@
 
 BUILD      ?= build
 ASAN_BUILD ?= build-asan
+FUZZ_BUILD ?= build-fuzz
 JOBS       ?= 2
+# `make fuzz`: seconds per target, and which targets (all when empty).
+FUZZ_SECONDS ?= 600
+FUZZ_TARGETS ?=
 
 # Everything the build, the tests and the demo need, beyond make and git.
 PKGS := g++ cmake pkg-config ca-certificates \
@@ -14,7 +18,7 @@ PKGS := g++ cmake pkg-config ca-certificates \
         xvfb xdotool x11-apps x11-utils imagemagick xfonts-base fonts-dejavu-core \
         lcov time
 
-.PHONY: all deps configure build demo test test-release test-asan bench lcov-check clean
+.PHONY: all deps configure build demo test test-release test-asan fuzz bench lcov-check clean
 
 all: build
 
@@ -53,6 +57,14 @@ test-asan: deps
 	cd $(ASAN_BUILD) && ctest --output-on-failure -j$(JOBS)
 
 test: test-release test-asan
+
+# Long fuzzing runs: every library instrumented, libFuzzer linked into the targets, each target
+# run for FUZZ_SECONDS; fails when any target crashes (docs/fuzzing.md).
+fuzz: deps
+	CC=clang CXX=clang++ cmake -S . -B $(FUZZ_BUILD) -DCMAKE_C_COMPILER=clang -DCMAKE_CXX_COMPILER=clang++ \
+	    -DCMAKE_BUILD_TYPE=RelWithDebInfo -DKG_LIBFUZZER=ON
+	cmake --build $(FUZZ_BUILD) -j$(JOBS) --target kg_fuzz_targets
+	bash fuzz/run_fuzz.sh $(FUZZ_BUILD) $(FUZZ_SECONDS) $(FUZZ_TARGETS)
 
 bench: build
 	@for b in bench/*.sh; do [ -f "$$b" ] && bash "$$b" $(BUILD) || exit 1; done
