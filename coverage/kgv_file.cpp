@@ -8,10 +8,12 @@
 #include <cstring>
 #include <ctime>
 
+#include <dirent.h>
 #include <sys/stat.h>
 #include <sys/uio.h>
 #include <unistd.h>
 
+#include "coverage/kgv_lock.h"
 #include "support/atomic_write.h"
 
 namespace {
@@ -282,9 +284,35 @@ ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out,
   return allOK;
 }
 
+namespace {
+
+// New copies that a writer killed before its rename left beside the target: their names are
+// the target's with a dot before and ".new." and six characters after.
+void removeAbandonedCopies(const std::string& target) {
+  size_t slash = target.find_last_of('/');
+  std::string dir = slash == std::string::npos ? "." : slash == 0 ? "/" : target.substr(0, slash);
+  std::string prefix = "." + (slash == std::string::npos ? target : target.substr(slash + 1)) + ".new.";
+  DIR* d = opendir(dir.c_str());
+  if (!d) return;
+  while (struct dirent* e = readdir(d)) {
+    std::string_view name = e->d_name;
+    if (name.size() != prefix.size() + 6 || name.substr(0, prefix.size()) != prefix) continue;
+    std::string full = dir + "/" + std::string(name);
+    struct stat st;
+    if (lstat(full.c_str(), &st) == 0 && S_ISREG(st.st_mode)) unlink(full.c_str());
+  }
+  closedir(d);
+}
+
+}  // namespace
+
 ErrorCode writeKgvFile(const std::string& path, KgvData& data) {
+  // Through a symbolic link the linked file is updated; the link stays.
+  const std::string target = writeTargetFor(path);
+  // Only the lock's holder can know that no other writer is at work.
+  if (kgvLockHeldHere(path)) removeAbandonedCopies(target);
   AtomicFileWriter w;
-  ErrorCode rc = w.open(path);
+  ErrorCode rc = w.open(target);
   if (rc != allOK) return rc;
   GatherWriter out(fileno(w.stream()));  // nothing goes through the stream's own buffer
   std::uint32_t now = static_cast<std::uint32_t>(time(nullptr));
@@ -327,5 +355,7 @@ ErrorCode writeKgvFile(const std::string& path, KgvData& data) {
     }
   }
   if (!out.flush()) return fileWriteFailed;
-  return w.commit();
+  // A writer whose lock was broken (it was paused past the break age) must not replace
+  // what the breaker wrote meanwhile.
+  return w.commit([&] { return checkKgvLockHeld(path); });
 }

@@ -64,5 +64,7 @@ ErrorCode readKgvFile(const std::string& path, std::unique_ptr<KgvData>& out,
 // Writes the data in this machine's byte order to a new file beside path, renamed over it
 // only when everything was written; on failure the file that was there stays as it was.
 // Sets saveTime, fills in unknown record times and rebuilds recordSizes. The caller holds
-// the lock of path.
+// the lock of path: left-over new copies of killed writers are removed, and when the lock
+// was broken meanwhile nothing is replaced (13). A path that is a symbolic link has the
+// linked file replaced, its permissions kept.
 ErrorCode writeKgvFile(const std::string& path, KgvData& data);

@@ -1,6 +1,8 @@
 // Loading files under their locks and merging them into one accumulated body.
 #include "coverage/kgv_load.h"
 
+#include <sys/stat.h>
+
 #include <ctime>
 #include <new>
 
@@ -10,17 +12,36 @@
 
 namespace {
 bool g_isJava = false;
+
+const char* nonRegularKind(mode_t mode) {
+  if (S_ISDIR(mode)) return "a directory";
+  if (S_ISFIFO(mode)) return "a FIFO (named pipe)";
+  if (S_ISCHR(mode)) return "a character device";
+  if (S_ISBLK(mode)) return "a block device";
+  if (S_ISSOCK(mode)) return "a socket";
+  return "not a regular file";
 }
+
+}  // namespace
 
 bool kgvIsJava() { return g_isJava; }
 void setKgvIsJava(bool isJava) { g_isJava = isJava; }
+
+ErrorCode refuseNonRegularDataFile(const std::string& path) {
+  struct stat st;
+  if (stat(path.c_str(), &st) != 0 || S_ISREG(st.st_mode)) return allOK;  // the read says why
+  recordSystemError(0, "%s is %s, not a data file.", path.c_str(), nonRegularKind(st.st_mode));
+  return notOurFile;
+}
 
 namespace {
 
 // Runs a read of the file under its lock; on success the reference's loadTime is set.
 template <class Read>
 ErrorCode underLock(KgvFileRef& ref, Read read) {
-  ErrorCode rc = lockKgvFile(ref.givenName);
+  ErrorCode rc = refuseNonRegularDataFile(ref.givenName);
+  if (rc != allOK) return rc;
+  rc = lockKgvFile(ref.givenName);
   if (rc != allOK) return rc;
   try {
     rc = read();

@@ -11,6 +11,12 @@
 #include "support/errors.h"
 #include "support/message_sink.h"
 
+// Only regular files are data files: a FIFO would hang its reader, holding the lock, and a
+// device could be read for ever. 1 for a regular or missing file (the read then says why);
+// 25 (notOurFile) with the detail "PATH is a directory, not a data file." and the like.
+// Loading checks this before taking any lock.
+ErrorCode refuseNonRegularDataFile(const std::string& path);
+
 // Locks the file named by the reference's given name, reads it, unlocks it; on success the
 // reference's loadTime becomes the current time.
 ErrorCode loadKgvFile(KgvFileRef& ref, std::unique_ptr<KgvData>& out);

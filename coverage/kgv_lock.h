@@ -22,8 +22,19 @@ using LockWaitCallback =
 // lock could not be removed; 49 the lock could not be created; 51 too many tries; 52 too
 // many lost races.
 ErrorCode lockKgvFile(const std::string& path);
-// 1 also when the lock is already gone; 46, 47 or 48.
+// 1 also when the lock is already gone; 46, 47 or 48. A lock of ours that another process
+// broke and replaced by its own is left to that process.
 ErrorCode unlockKgvFile(const std::string& path);
+
+// While a lock is held it is renewed every few seconds, so that peers never take it for
+// left over; and a stopping signal removes it.
+
+// Before replacing a file: 1 when this process still holds the lock it took for the path
+// (or locking is off, or it never took one); 13 (unabelToLock, the detail recorded) when
+// another process broke it meanwhile.
+ErrorCode checkKgvLockHeld(const std::string& path);
+// Whether locking is on and the lock of the path is this process's own right now.
+bool kgvLockHeldHere(const std::string& path);
 
 // Returns the previous callback.
 LockWaitCallback setLockWaitCallback(LockWaitCallback callback);

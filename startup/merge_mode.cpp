@@ -2,6 +2,7 @@
 #include "startup/merge_mode.h"
 
 #include "coverage/kgv_file.h"
+#include "coverage/kgv_load.h"
 #include "coverage/kgv_lock.h"
 #include "startup/console_report.h"
 #include "startup/load_files.h"
@@ -12,7 +13,8 @@ ErrorCode runMergeMode(StartupState& s) {
   setLockWaitCallback(consoleLockReporter);
   setLockTimes(45, 0, 0);
   setLockingEnabled(s.lockingEnabled);
-  ErrorCode rc = lockKgvFile(target);
+  ErrorCode rc = refuseNonRegularDataFile(target);
+  if (rc == allOK) rc = lockKgvFile(target);
   if (rc == lockAborted) return rc;
   if (rc != allOK) {
     reportError(rc, "Couldn't write the file %s.\n%s\n", target.c_str(), errorMessage(rc).c_str());

@@ -117,7 +117,15 @@ void KG_SumFrame::writeKgvTo() {
   std::string path;
   KG_SummaryOverall* all = overall();
   if (all == nullptr || !askFile(kgSettings().saveKgvFilePrompt.c_str(), path)) return;
-  ErrorCode rc = writeKgvFile(path, all->data());
+  // Instrumented programs and other viewers use the same file: written under its lock.
+  ErrorCode rc = refuseNonRegularDataFile(path);
+  if (rc == allOK) rc = lockKgvFile(path);
+  if (rc == lockAborted) return;  // the user chose not to wait
+  if (rc == allOK) {
+    rc = writeKgvFile(path, all->data());
+    ErrorCode unlocked = unlockKgvFile(path);
+    if (rc == allOK) rc = unlocked;
+  }
   if (rc != allOK) show_error(rc, "Couldn't write the file");
 }
 

@@ -13,6 +13,8 @@
 #include <string>
 #include <vector>
 
+#include "support/cleanup_paths.h"
+
 namespace {
 
 struct State {
@@ -140,6 +142,8 @@ void runCleanups() {
     c.pop_back();
     action.first(action.second);
   }
+  // Held locks and unfinished files go with the process.
+  removeCleanupPaths();
 }
 
 void enableVerbose(const char* category, bool on) {

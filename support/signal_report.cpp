@@ -15,6 +15,7 @@
 #include <string>
 #include <vector>
 
+#include "support/cleanup_paths.h"
 #include "support/diagnostic.h"
 
 namespace diag {
@@ -72,6 +73,7 @@ void fatalSignal(int sig, siginfo_t* info, void* context) {
   if (gInReport) _exit(1);
   gInReport = 1;
 
+  removeCleanupPaths();  // first: it cannot fail, whatever state the rest is in
   diag::runCleanups();
 
   const std::string& label = diag::label();
@@ -143,6 +145,14 @@ void fatalSignal(int sig, siginfo_t* info, void* context) {
   _exit(1);
 }
 
+// Interrupt and termination: what the process holds is given back, then the signal takes
+// its ordinary course, so that the parent sees how the process ended.
+void stopSignal(int sig) {
+  removeCleanupPaths();
+  signal(sig, SIG_DFL);
+  raise(sig);
+}
+
 }  // namespace
 
 void kgInstallSignalHandlers() {
@@ -164,6 +174,16 @@ void kgInstallSignalHandlers() {
   sigemptyset(&sa.sa_mask);
   for (int sig : {SIGHUP, SIGQUIT, SIGILL, SIGABRT, SIGFPE, SIGBUS, SIGSEGV}) sigaction(sig, &sa, nullptr);
   signal(SIGPIPE, SIG_IGN);
+
+  struct sigaction stop {};
+  stop.sa_handler = stopSignal;
+  sigemptyset(&stop.sa_mask);
+  for (int sig : {SIGINT, SIGTERM}) {
+    // A shell that started us in the background with interrupts ignored keeps them so.
+    struct sigaction old {};
+    if (sigaction(sig, nullptr, &old) == 0 && old.sa_handler == SIG_IGN) continue;
+    sigaction(sig, &stop, nullptr);
+  }
 }
 
 // ---- demangling ----

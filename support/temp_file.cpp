@@ -7,6 +7,8 @@
 #include <cstdlib>
 #include <vector>
 
+#include "support/cleanup_paths.h"
+
 namespace {
 bool gTempComputed = false;
 std::string gTempDir;
@@ -48,6 +50,7 @@ FILE* createTemporaryFile(const char* prefix, std::string& path) {
 bool TemporaryFile::create(const char* prefix) {
   remove();
   stream_ = createTemporaryFile(prefix, path_);
+  if (stream_) cleanupSlot_ = registerCleanupPath(path_, CleanupPathKind::file);
   return stream_ != nullptr;
 }
 
@@ -57,5 +60,7 @@ void TemporaryFile::remove() {
     stream_ = nullptr;
     unlink(path_.c_str());
   }
+  unregisterCleanupPath(cleanupSlot_);
+  cleanupSlot_ = -1;
   path_.clear();
 }

@@ -14,7 +14,8 @@ void kgResetTempDirectory();
 // path then holds the name pattern).
 FILE* createTemporaryFile(const char* prefix, std::string& path);
 
-// A temporary file made by createTemporaryFile, closed and removed when it goes.
+// A temporary file made by createTemporaryFile, closed and removed when it goes, or by a
+// stopping signal.
 class TemporaryFile {
  public:
   TemporaryFile() = default;
@@ -34,4 +35,5 @@ class TemporaryFile {
  private:
   FILE* stream_ = nullptr;
   std::string path_;
+  int cleanupSlot_ = -1;
 };

@@ -8,6 +8,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <chrono>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
@@ -124,6 +125,68 @@ ProcessResult runProcess(const std::vector<std::string>& argv, const std::vector
   waitpid(pid, &status, 0);
   r.status = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
   return r;
+}
+
+BackgroundProcess::BackgroundProcess(const std::vector<std::string>& argv,
+                                     const std::vector<std::string>& env, const std::string& cwd) {
+  pid_ = fork();
+  if (pid_ < 0) throw std::runtime_error("fork failed");
+  if (pid_ == 0) {
+    int in = open("/dev/null", O_RDONLY);
+    int out = open(outputs_.file("out").c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
+    int err = open(outputs_.file("err").c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
+    if (in < 0 || out < 0 || err < 0) _exit(126);
+    dup2(in, 0);
+    dup2(out, 1);
+    dup2(err, 2);
+    for (const auto& e : env) {
+      size_t eq = e.find('=');
+      if (eq == std::string::npos) unsetenv(e.c_str());
+      else setenv(e.substr(0, eq).c_str(), e.substr(eq + 1).c_str(), 1);
+    }
+    if (!cwd.empty() && chdir(cwd.c_str()) != 0) _exit(126);
+    std::vector<char*> args;
+    for (const auto& a : argv) args.push_back(const_cast<char*>(a.c_str()));
+    args.push_back(nullptr);
+    ::signal(SIGPIPE, SIG_DFL);
+    execv(args[0], args.data());
+    _exit(127);
+  }
+}
+
+BackgroundProcess::~BackgroundProcess() {
+  if (pid_ > 0) {
+    kill(pid_, SIGKILL);
+    kill(pid_, SIGCONT);
+    waitpid(pid_, nullptr, 0);
+  }
+}
+
+void BackgroundProcess::signal(int sig) const {
+  if (pid_ > 0) kill(pid_, sig);
+}
+
+ProcessResult BackgroundProcess::wait() {
+  ProcessResult r;
+  if (pid_ <= 0) return r;
+  int status = 0;
+  waitpid(pid_, &status, 0);
+  pid_ = -1;
+  r.status = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
+  r.out = readFile(outputs_.file("out"));
+  r.err = readFile(outputs_.file("err"));
+  return r;
+}
+
+std::string BackgroundProcess::errorsSoFar() const { return readFile(outputs_.file("err")); }
+
+bool waitUntil(double seconds, const std::function<bool()>& condition) {
+  auto end = std::chrono::steady_clock::now() + std::chrono::duration<double>(seconds);
+  while (!condition()) {
+    if (std::chrono::steady_clock::now() >= end) return condition();
+    usleep(20000);
+  }
+  return true;
 }
 
 XvfbServer::XvfbServer() {

@@ -1,6 +1,7 @@
 // Helpers shared by the tests: scratch directories, files, and running real processes.
 #pragma once
 
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -35,6 +36,30 @@ struct ProcessResult {
 ProcessResult runProcess(const std::vector<std::string>& argv,
                          const std::vector<std::string>& env = {}, const std::string& input = {},
                          const std::string& cwd = {});
+
+// A process left running while the test acts on it (signals, files), its output gathered
+// into files; the destructor kills it if it is still there.
+class BackgroundProcess {
+ public:
+  BackgroundProcess(const std::vector<std::string>& argv, const std::vector<std::string>& env = {},
+                    const std::string& cwd = {});
+  ~BackgroundProcess();
+  BackgroundProcess(const BackgroundProcess&) = delete;
+  BackgroundProcess& operator=(const BackgroundProcess&) = delete;
+  int pid() const { return pid_; }
+  void signal(int sig) const;
+  // Waits for the end; status as in ProcessResult.
+  ProcessResult wait();
+  // What it has written to standard error so far.
+  std::string errorsSoFar() const;
+
+ private:
+  TempDir outputs_;
+  int pid_ = -1;
+};
+
+// Polls until the condition holds or the seconds pass; the condition's last value.
+bool waitUntil(double seconds, const std::function<bool()>& condition);
 
 // A private X server on a free display, for tests that need one; never the user's display.
 class XvfbServer {

@@ -186,3 +186,104 @@ TEST_F(Locks, LocksThatCannotBeMadeOrRemovedAreReported) {
   EXPECT_EQ(unlockKgvFile(kgv), lockDirNotRemove);
   clearPendingSystemError();
 }
+
+TEST_F(Locks, AHeldLockStaysFreshSoPeersNeverTakeItForLeftOver) {
+  ASSERT_EQ(lockKgvFile(kgv), allOK);
+  struct stat st;
+  ASSERT_EQ(stat(lock.c_str(), &st), 0);
+  const time_t made = st.st_ctime;
+  // Long work while the lock is held: peers break locks older than their break age.
+  sleep(7);
+  ASSERT_EQ(stat(lock.c_str(), &st), 0);
+  EXPECT_GT(st.st_ctime, made);
+  EXPECT_LE(time(nullptr) - st.st_ctime, 5) << "renewed well within ten seconds";
+  EXPECT_EQ(st.st_mode & 0777, 0222u);
+  ASSERT_EQ(unlockKgvFile(kgv), allOK);
+  EXPECT_FALSE(isDirectory(lock));
+}
+
+TEST_F(Locks, AWriterWhoseLockWasBrokenLeavesTheBreakersFileAndLock) {
+  ASSERT_EQ(lockKgvFile(kgv), allOK);
+  std::unique_ptr<KgvData> mine = readOk(kgv);
+  // Another process found the lock old, broke it and wrote the file under its own lock. (A
+  // breaker comes at least the break age later; a moment later is enough to tell the
+  // directories apart even when the new one gets the same inode number.)
+  usleep(50000);
+  ASSERT_EQ(rmdir(lock.c_str()), 0);
+  ASSERT_EQ(mkdir(lock.c_str(), 0222), 0);
+  std::string theirs = "theirs";
+  writeFile(kgv, theirs);
+
+  EXPECT_EQ(checkKgvLockHeld(kgv), unabelToLock);
+  EXPECT_EQ(writeKgvFile(kgv, *mine), unabelToLock);
+  EXPECT_NE(errorMessage(unabelToLock).find("The lock " + lock +
+                                            " was broken by another process while this one held it"),
+            std::string::npos);
+  EXPECT_EQ(readFile(kgv), theirs);
+  EXPECT_EQ(unlockKgvFile(kgv), allOK);
+  EXPECT_TRUE(isDirectory(lock)) << "the breaker's lock is not ours to remove";
+  EXPECT_EQ(filesIn(dir.path()), (std::vector<std::string>{".lock.quor.a.kgv", "a.kgv"}));
+  // Gone as well: the same answer.
+  ASSERT_EQ(rmdir(lock.c_str()), 0);
+  ASSERT_EQ(lockKgvFile(kgv), allOK);
+  ASSERT_EQ(rmdir(lock.c_str()), 0);
+  EXPECT_EQ(writeKgvFile(kgv, *mine), unabelToLock);
+  EXPECT_EQ(unlockKgvFile(kgv), allOK);
+  clearPendingSystemError();
+}
+
+TEST_F(Locks, TheLockHolderClearsNewCopiesThatKilledWritersLeft) {
+  std::unique_ptr<KgvData> d = readOk(kgv);
+  const std::string left = dir.file(".a.kgv.new.Qx7Lp2");
+  writeFile(left, std::string(4096, 'x'));
+  writeFile(dir.file(".a.kgv.new.notes"), "not one of ours");
+  writeFile(dir.file(".b.kgv.new.Qx7Lp2"), "another file's");
+  // Without the lock another writer may be at work: its copy stays.
+  setLockingEnabled(false);
+  ASSERT_EQ(writeKgvFile(kgv, *d), allOK);
+  EXPECT_TRUE(fileExists(left));
+  setLockingEnabled(true);
+  ASSERT_EQ(lockKgvFile(kgv), allOK);
+  ASSERT_EQ(writeKgvFile(kgv, *d), allOK);
+  ASSERT_EQ(unlockKgvFile(kgv), allOK);
+  EXPECT_EQ(filesIn(dir.path()),
+            (std::vector<std::string>{".a.kgv.new.notes", ".b.kgv.new.Qx7Lp2", "a.kgv"}));
+}
+
+TEST_F(Locks, ATargetReachedThroughALinkIsWrittenThroughIt) {
+  std::unique_ptr<KgvData> d = readOk(kgv);
+  ASSERT_EQ(mkdir(dir.file("shared").c_str(), 0755), 0);
+  std::string real = dir.file("shared/run.kgv");
+  std::string link = dir.file("run.kgv");
+  writeFile(real, "old");
+  ASSERT_EQ(chmod(real.c_str(), 0640), 0);
+  ASSERT_EQ(symlink("shared/run.kgv", link.c_str()), 0);
+  ASSERT_EQ(lockKgvFile(link), allOK);
+  ASSERT_EQ(writeKgvFile(link, *d), allOK);
+  ASSERT_EQ(unlockKgvFile(link), allOK);
+  struct stat st;
+  ASSERT_EQ(lstat(link.c_str(), &st), 0);
+  EXPECT_TRUE(S_ISLNK(st.st_mode));
+  ASSERT_EQ(stat(real.c_str(), &st), 0);
+  EXPECT_EQ(st.st_mode & 0777, 0640u);
+  EXPECT_EQ(readOk(real)->records.size(), d->records.size());
+  EXPECT_EQ(filesIn(dir.file("shared")), std::vector<std::string>{"run.kgv"});
+}
+
+TEST_F(Locks, NonRegularFilesAreRefusedBeforeAnyLock) {
+  ASSERT_EQ(mkfifo(dir.file("pipe.kgv").c_str(), 0600), 0);
+  ASSERT_EQ(mkdir(dir.file("dir.kgv").c_str(), 0755), 0);
+  struct Case {
+    std::string path, kind;
+  };
+  for (const Case& c : {Case{dir.file("pipe.kgv"), "a FIFO (named pipe)"},
+                        Case{dir.file("dir.kgv"), "a directory"},
+                        Case{"/dev/zero", "a character device"}}) {
+    KgvFileRef ref = makeKgvFileRef(c.path);
+    std::unique_ptr<KgvData> d;
+    EXPECT_EQ(loadKgvFile(ref, d), notOurFile) << c.path;
+    EXPECT_NE(errorMessage(notOurFile).find(c.path + " is " + c.kind + ", not a data file."),
+              std::string::npos) << c.path;
+  }
+  EXPECT_EQ(filesIn(dir.path()), (std::vector<std::string>{"a.kgv", "dir.kgv", "pipe.kgv"}));
+}

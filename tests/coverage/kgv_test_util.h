@@ -4,6 +4,7 @@
 #include <dirent.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstring>
 #include <vector>
 
@@ -50,7 +51,7 @@ inline std::string describeMap(const ObjRecord& r) {
   return s;
 }
 
-// The names in a directory, without "." and "..".
+// The names in a directory, without "." and "..", sorted.
 inline std::vector<std::string> filesIn(const std::string& dir) {
   std::vector<std::string> names;
   if (DIR* d = opendir(dir.c_str())) {
@@ -58,6 +59,7 @@ inline std::vector<std::string> filesIn(const std::string& dir) {
       if (std::strcmp(e->d_name, ".") && std::strcmp(e->d_name, "..")) names.push_back(e->d_name);
     closedir(d);
   }
+  std::sort(names.begin(), names.end());
   return names;
 }
 

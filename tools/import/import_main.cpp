@@ -7,6 +7,7 @@
 
 #include "coverage/kgv_file.h"
 #include "coverage/kgv_lock.h"
+#include "support/diagnostic.h"
 #include "tools/import/coverage_import.h"
 #include "tools/import/import_records.h"
 
@@ -28,6 +29,8 @@ int fail(const std::string& message) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  // Stopped part way, the output's lock and its unfinished new copy go with the process.
+  kgInstallSignalHandlers();
   std::string out;
   std::vector<std::string> inputs;
   for (int i = 1; i < argc; ++i) {
