@@ -85,6 +85,19 @@ class GuardedWriter {
     return *this;
   }
   GuardedWriter& text(const char* s) { return text(std::string_view(s)); }
+  // A name from a data file: a tab or newline in it would split its record and forge
+  // others for the scripts that read the report, so every control character becomes "?".
+  GuardedWriter& name(std::string_view s) {
+    std::size_t from = 0;
+    for (std::size_t i = 0; i < s.size(); ++i) {
+      unsigned char c = static_cast<unsigned char>(s[i]);
+      if (c >= 0x20 && c != 0x7F) continue;
+      text(s.substr(from, i - from));
+      ch('?');
+      from = i + 1;
+    }
+    return text(s.substr(from));
+  }
   GuardedWriter& tab() { return ch('\t'); }
   // Two digits at a time: most numbers of a report are small line numbers and counts.
   GuardedWriter& number(std::uint32_t v) {
@@ -183,7 +196,7 @@ void writeHeader(GuardedWriter& w, std::time_t when) {
 
 void writeFunction(GuardedWriter& w, const SumFile& file, const std::vector<LineState>& states,
                    const SumFunc& fn) {
-  w.text("fu\t").text(fn.name).tab().number(fn.counts.unusedBlocks).tab().number(fn.counts.blocks);
+  w.text("fu\t").name(fn.name).tab().number(fn.counts.unusedBlocks).tab().number(fn.counts.blocks);
   w.tab().number(fn.counts.adjUnusedLines).tab().number(fn.counts.adjLines);
   w.tab().number(saturate(fn.calls));
   w.endLine();
@@ -212,7 +225,7 @@ void writeFunction(GuardedWriter& w, const SumFile& file, const std::vector<Line
       w.endLine();
     }
   }
-  w.text("efu\t").text(fn.name).endLine();
+  w.text("efu\t").name(fn.name).endLine();
 }
 
 }  // namespace
@@ -235,22 +248,22 @@ ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when, Messa
   for (const SumDir* d : root.dirOrder) {
     if (w.failed()) break;
     const SumCounts& c = d->counts;
-    w.text("di\t").text(d->name).tab().number(c.unusedBlocks).tab().number(c.blocks);
+    w.text("di\t").name(d->name).tab().number(c.unusedBlocks).tab().number(c.blocks);
     w.tab().number(c.adjUnusedLines).tab().number(c.adjLines).tab().number(d->unusedFuncs);
     w.tab().number(d->funcs).tab().number(d->files);
     w.endLine();
     for (const SumFile* f : d->fileOrder) {
       if (w.failed()) break;
       const SumCounts& fc = f->counts;
-      w.text("fi\t").text(f->name).tab().number(fc.unusedBlocks).tab().number(fc.blocks);
+      w.text("fi\t").name(f->name).tab().number(fc.unusedBlocks).tab().number(fc.blocks);
       w.tab().number(fc.adjUnusedLines).tab().number(fc.adjLines).tab().number(f->unusedFuncs);
       w.tab().number(f->funcs).tab().number(saturate(f->sessions));
       w.endLine();
       const std::vector<LineState>& states = lineStates.of(*f);
       for (const SumFunc* fn : f->funcOrder) writeFunction(w, *f, states, *fn);
-      w.text("efi\t").text(f->name).endLine();
+      w.text("efi\t").name(f->name).endLine();
     }
-    w.text("edi\t").text(d->name).endLine();
+    w.text("edi\t").name(d->name).endLine();
   }
   return w.finish();
 }

@@ -3,6 +3,9 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include <map>
+#include <sstream>
+
 #include "tests/coverage/kgv_test_util.h"
 
 using kgtest::runProcess;
@@ -109,6 +112,47 @@ TEST(ExportCommand, DataThatCannotBeSummarisedStopWithTheirCode) {
   EXPECT_EQ(r.status, 28);
   EXPECT_EQ(r.err.rfind("Kestrelgauge: Couldn't summarize information:\n", 0), 0u) << r.err;
   EXPECT_EQ(r.out, "");
+}
+
+TEST(ExportCommand, ControlCharactersInNamesCannotForgeRecords) {
+  Home home;
+  // Names of equal length stand in for the crafted ones, which the description cannot spell.
+  const std::string fileName = "x\nfi\tevil\t0\t1\t99999\t1\t0\t0\t1\n.c";
+  const std::string funcName = "f\tg\r\x01h\x7f";
+  const std::string fileStandIn(fileName.size(), 'F');
+  const std::string funcStandIn(funcName.size(), 'G');
+  std::string image, error;
+  ASSERT_TRUE(makeKgvImage("record d/" + fileStandIn + "\nfunction " + funcStandIn +
+                               " line=1 calls=1\nblock 2 hits=1\n",
+                           image, error)) << error;
+  image.replace(image.find(fileStandIn), fileName.size(), fileName);
+  image.replace(image.find(funcStandIn), funcName.size(), funcName);
+  std::string data = home.dir.file("crafted.kgv");
+  kgtest::writeFile(data, image);
+
+  auto r = runProcess({kestrel(), "-export", data}, home.env());
+  ASSERT_EQ(r.status, 0) << r.err;
+  const std::map<std::string, size_t> fields = {{"to", 9}, {"di", 9},  {"fi", 9},  {"fu", 7},
+                                                {"li", 3}, {"bl", 3},  {"efu", 2}, {"efi", 2},
+                                                {"edi", 2}};
+  std::istringstream lines(r.out);
+  std::string line;
+  std::vector<std::string> names;
+  while (std::getline(lines, line)) {
+    if (line[0] == '#') continue;
+    std::vector<std::string> f;
+    std::istringstream cells(line);
+    for (std::string c; std::getline(cells, c, '\t');) f.push_back(c);
+    ASSERT_TRUE(fields.count(f[0])) << "forged record: " << line;
+    EXPECT_EQ(f.size(), fields.at(f[0])) << line;
+    if (f[0] == "fi" || f[0] == "fu") names.push_back(f[1]);
+  }
+  EXPECT_EQ(names, (std::vector<std::string>{"x?fi?evil?0?1?99999?1?0?0?1?.c", "f?g??h?"}));
+  // The bundled script sees one file, fully covered.
+  auto table = runProcess({"/bin/sh", kgtest::buildDir() + "/scripts/file-coverage"}, {}, r.out);
+  EXPECT_EQ(table.status, 0);
+  EXPECT_EQ(table.out.find('-'), std::string::npos) << table.out;
+  EXPECT_NE(table.out.find(" 100.0%"), std::string::npos) << table.out;
 }
 
 TEST(ExtractCommand, MarkersOfEverySourceFileGoToTheAdjustmentsFile) {

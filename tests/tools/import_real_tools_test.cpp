@@ -1,5 +1,6 @@
 // kestrel-import on coverage the machine's own gcc, gcov and lcov produce during the test.
 #include <gtest/gtest.h>
+#include <zlib.h>
 
 #include <map>
 
@@ -146,4 +147,37 @@ TEST(ImportCommand, BadInputIsRefusedWithoutAnOutputFile) {
   EXPECT_EQ(r.status, 2);
   EXPECT_EQ(r.err, "kestrel-import: the inputs hold no coverage data\n");
   EXPECT_FALSE(kgtest::fileExists(dir.file("out.kgv")));
+}
+
+TEST(ImportCommand, AGzipBombIsRefusedWithinItsCeiling) {
+  kgtest::TempDir dir;
+  // A tracefile head, then 400 MB of one repeated byte: about 400 KB compressed.
+  std::string bomb = dir.file("bomb.info.gz");
+  gzFile out = gzopen(bomb.c_str(), "wb9");
+  ASSERT_NE(out, nullptr);
+  gzputs(out, "TN:\nSF:/src/a.c\n");
+  const std::string block(1 << 20, 'A');
+  for (int i = 0; i < 400; ++i) ASSERT_EQ(gzwrite(out, block.data(), block.size()), int(block.size()));
+  ASSERT_EQ(gzclose(out), Z_OK);
+
+  std::string importer = kgtest::binPath("kestrel-import");
+  std::string command = "exec '" + importer + "' -o '" + dir.file("out.kgv") + "' '" + bomb + "'";
+#if !defined(__SANITIZE_ADDRESS__)
+  // Without the ceiling the whole text would be read: far more than this allows.
+  command = "ulimit -v 300000 && " + command;
+#endif
+  auto r = runProcess({"/bin/sh", "-c", command});
+  EXPECT_EQ(r.status, 2);
+  EXPECT_NE(r.err.find("kestrel-import: " + bomb + ": cannot read: it inflates to more than 67108864 "
+                       "bytes (64 times its compressed size); refused as a likely gzip bomb\n"),
+            std::string::npos) << r.err;
+  EXPECT_FALSE(kgtest::fileExists(dir.file("out.kgv")));
+
+  // An ordinary compressed tracefile stays well inside it.
+  std::string small = dir.file("small.info.gz");
+  out = gzopen(small.c_str(), "wb9");
+  gzputs(out, "TN:\nSF:/src/a.c\nFN:1,main\nFNDA:1,main\nDA:2,1\nend_of_record\n");
+  ASSERT_EQ(gzclose(out), Z_OK);
+  r = runProcess({importer, "-o", dir.file("out.kgv"), small});
+  EXPECT_EQ(r.status, 0) << r.err;
 }

@@ -1,9 +1,12 @@
 // The neutral import model, reading compressed or plain inputs, and format detection.
 #include "tools/import/coverage_import.h"
 
+#include <sys/stat.h>
 #include <zlib.h>
 
+#include <algorithm>
 #include <cerrno>
+#include <cstdint>
 #include <cstring>
 
 ImportedFunction& ImportedFile::function(const std::string& name) {
@@ -33,9 +36,22 @@ std::string ImportError::text() const {
   return file + ":" + std::to_string(line) + ": " + message;
 }
 
+namespace {
+constexpr std::uint64_t kInflationRatio = 64;
+constexpr std::uint64_t kInflationFloor = std::uint64_t{64} << 20;
+constexpr std::uint64_t kMaxInflated = std::uint64_t{4} << 30;
+}  // namespace
+
 bool readInputText(const std::string& path, std::string& text, ImportError& error) {
   error.file = path;
   error.line = 0;
+  // A compressed input may inflate to no more than this: real coverage reports compress
+  // perhaps thirty-fold, a crafted one a thousand-fold and more, to fill the memory.
+  struct stat st;
+  std::uint64_t ceiling = kMaxInflated;
+  if (stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode))
+    ceiling = std::clamp<std::uint64_t>(std::uint64_t(st.st_size) * kInflationRatio,
+                                        kInflationFloor, kMaxInflated);
   // gzread passes plain files through unchanged, so one reader serves both.
   gzFile f = gzopen(path.c_str(), "rb");
   if (!f) {
@@ -56,6 +72,15 @@ bool readInputText(const std::string& path, std::string& text, ImportError& erro
     }
     if (n == 0) break;
     text.append(buf, static_cast<size_t>(n));
+    if (text.size() > ceiling && !gzdirect(f)) {
+      error.message = "cannot read: it inflates to more than " + std::to_string(ceiling) +
+                      " bytes (" + std::to_string(kInflationRatio) +
+                      " times its compressed size); refused as a likely gzip bomb";
+      gzclose(f);
+      text.clear();
+      text.shrink_to_fit();
+      return false;
+    }
   }
   int rc = gzclose(f);
   if (rc != Z_OK && rc != Z_BUF_ERROR) {
