@@ -101,14 +101,18 @@ bool isPlainTextBytes(std::string_view head) {
   return head.size() > 10 * odd || head.empty();
 }
 
-bool isPlainTextOrUtf8Bytes(std::string_view head, bool truncated) {
-  if (isPlainTextBytes(head)) return true;
+bool isTextInAnyEncoding(std::string_view head) {
   size_t odd = 0;
   for (unsigned char c : head) {
     if (c == 0) return false;
     if (isOddControl(c)) ++odd;
   }
-  return head.size() > 10 * odd && isMultiByteUtf8(head, truncated);
+  return head.size() > 10 * odd || head.empty();
+}
+
+bool isPlainTextOrUtf8Bytes(std::string_view head, bool truncated) {
+  if (isPlainTextBytes(head)) return true;
+  return isTextInAnyEncoding(head) && isMultiByteUtf8(head, truncated);
 }
 
 bool isPlainText(int fd) {

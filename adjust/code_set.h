@@ -28,6 +28,9 @@ bool isPlainTextBytes(std::string_view head);
 // script: bytes of valid UTF-8 count as ordinary. `truncated`: the head was cut from a
 // longer text, so a character cut off at its end is no fault.
 bool isPlainTextOrUtf8Bytes(std::string_view head, bool truncated);
+// Text in any encoding: no NUL and few odd control bytes; bytes with the high bit set are
+// not counted at all.
+bool isTextInAnyEncoding(std::string_view head);
 
 // The code set of an open file (its position is unchanged); codeSetNotText for anything that
 // is not a readable regular text file. Multi-byte text is allowed here, unlike isPlainText.

@@ -188,7 +188,7 @@ TEST_F(AdjustmentsFile, AWrongBannerOrABinaryFileIsRejectedAsAWhole) {
                       ":\nthe file does not begin with the\nadjustments file banner:\n   "
                       "Kestrelgauge Adjustments File 1.0\nso it is not a valid "
                       "Kestrelgauge\nadjustments file.\n");
-  w = read(kBanner + std::string(100, '\xff'));
+  w = read(kBanner + std::string("\x7f" "ELF\x02\x01\x01\0\0\0\0\x03\0\x3e\0", 16) + std::string(200, '\xff'));
   ASSERT_EQ(w.size(), 1u);
   EXPECT_EQ(w[0], "Line 1 of " + path +
                       ":\nthe file is not a plain text file\n(it contains a lot of non-ASCII "
@@ -239,6 +239,43 @@ TEST_F(AdjustmentsFile, PathsInAnyScriptReadBackAsWritten) {
   EXPECT_EQ(records(readFile(path)), records(first));
 }
 
+TEST_F(AdjustmentsFile, PathsThatAreNotUtf8ReadBackToo) {
+  // Folder names from older systems hold Latin-1 and other bytes that are not UTF-8.
+  std::string latin1 = dir.file("r\xe9sum\xe9s-\xe0-\xe9t\xe9-\xfc\xf6\xe4\xdf-\xe5\xf8\xe6");
+  ASSERT_EQ(mkdir(latin1.c_str(), 0755), 0);
+  std::string a = src("r\xe9sum\xe9s-\xe0-\xe9t\xe9-\xfc\xf6\xe4\xdf-\xe5\xf8\xe6/\xe9\xe9\xe9\xe9.c");
+  auto set = std::make_unique<CvgAdjustSet>();
+  set->addRange(adjLineInspected, 4, 9);
+  adjustmentList().storeSet(std::move(set), a, 77);
+  ASSERT_EQ(writeAdjustmentsFile(), allOK);
+  adjustmentList().clear();
+  EXPECT_EQ(readAdjustmentsFile(path), std::vector<std::string>{});
+  ASSERT_EQ(adjustmentList().size(), 1u);
+  EXPECT_EQ(adjustmentList().entries()[0].resolvedName(), a);
+
+  // The input the reader's fuzz target found: its names hold bytes 0xff.
+  std::string found = readFile(kgtest::sourceDir() +
+                               "/fuzz/regressions/adjustments_reader_fuzz/"
+                               "crash-fed75bc2b1528d7ba2f3881ff71f89fbb6d6975c-minimized");
+  AdjustmentList list;
+  std::vector<std::string> warnings;
+  parseAdjustments(kBanner + found, "found", list, warnings);
+  ASSERT_FALSE(list.empty());
+  ASSERT_NE(list.entries()[0].resolvedName().find('\xff'), std::string::npos);
+  char* buf = nullptr;
+  size_t len = 0;
+  FILE* out = open_memstream(&buf, &len);
+  ASSERT_TRUE(writeAdjustments(out, "test", list));
+  fclose(out);
+  std::string written(buf, len);
+  free(buf);
+  AdjustmentList again;
+  warnings.clear();
+  EXPECT_TRUE(parseAdjustments(written, "written", again, warnings));
+  EXPECT_EQ(warnings, std::vector<std::string>{});
+  EXPECT_EQ(again.size(), list.size());
+}
+
 TEST_F(AdjustmentsFile, CarriageReturnLineEndsAreRead) {
   std::string a = src("a.c");
   std::string unixText = kBanner + "# notes\n" + a + "\t100\ttested\tL\t 5 3-4\n\n" + a +
@@ -264,7 +301,7 @@ TEST_F(AdjustmentsFile, AFileThatCouldNotBeReadIsNeverOverwritten) {
     adjustmentList().storeSet(std::move(set), a, 7);
   };
   const std::vector<std::string> unreadable = {
-      kBanner + std::string(600, '\xff') + "\n",            // not text
+      kBanner + std::string("\x01\x02\0\0\x05\x06\x07\0", 8) + std::string(600, '\xff'),  // binary
       "Kestrelgauge Adjustments File 9.9\n/a.c\t1\ttested\tL\t1\n",  // another format
   };
   for (const std::string& body : unreadable) {
