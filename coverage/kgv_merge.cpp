@@ -298,6 +298,7 @@ struct RecordSource {
   std::string_view name() const { return slot->fileNameView(); }
   size_t mapSize() const { return slot->map.size(); }
   size_t stringBytes() const { return slot->strings.size(); }
+  const char* strings() const { return slot->strings.data(); }
   const std::uint32_t* map() const { return slot->map.data(); }
   const std::uint16_t* counts() const { return slot->counts.data(); }
   const ObjRecord& record() { return *slot; }
@@ -313,6 +314,7 @@ struct BytesSource {
   std::string_view name() const { return b.fileName(); }
   size_t mapSize() const { return b.mapCount; }
   size_t stringBytes() const { return b.stringBytes; }
+  const char* strings() const { return b.strings; }
   const std::uint32_t* map() const { return b.map; }
   const std::uint16_t* counts() const { return b.counts; }
   const ObjRecord& record() {
@@ -321,6 +323,39 @@ struct BytesSource {
   }
   std::unique_ptr<ObjRecord> take() { return made ? std::move(made) : makeObjRecord(b); }
 };
+
+// The name at an offset of a string area, ending at its NUL or at the area's end.
+std::string_view nameIn(const char* strings, size_t bytes, std::uint32_t offset) {
+  if (offset >= bytes) return {};
+  const char* p = strings + offset;
+  return std::string_view(p, strnlen(p, bytes - offset));
+}
+
+// Whether two records of one version lay out the same map: the same entries in the same
+// places (a block may be a further line of the block before on one side), the same lines,
+// the same names. Only then can counts be added position by position.
+template <class Source>
+bool sameLayout(const ObjRecord& x, const Source& src) {
+  const size_t n = src.mapSize();
+  if (n != x.map.size()) return false;
+  if (std::memcmp(x.map.data(), src.map(), n * 4) == 0 && src.stringBytes() == x.strings.size() &&
+      std::memcmp(x.strings.data(), src.strings(), x.strings.size()) == 0)
+    return true;
+  for (size_t i = 0; i < n; ++i) {
+    std::uint32_t a = x.map[i], b = src.map()[i];
+    std::uint32_t ta = mapTag(a), tb = mapTag(b);
+    auto blockish = [](std::uint32_t t) { return t == TagBlock || t == TagBlockLine; };
+    if (ta != tb && !(blockish(ta) && blockish(tb))) return false;
+    if (ta == TagFile || ta == TagFunction) {
+      if (nameIn(x.strings.data(), x.strings.size(), mapValue(a)) !=
+          nameIn(src.strings(), src.stringBytes(), mapValue(b)))
+        return false;
+    } else if (ta != TagEmpty && mapValue(a) != mapValue(b)) {
+      return false;
+    }
+  }
+  return true;
+}
 
 }  // namespace
 
@@ -336,10 +371,18 @@ void KgvMerger::mergeOne(std::uint32_t mode, Source& src, std::vector<std::strin
   size_t at = found->second;
   ObjRecord& x = *a_.records[at];
   const ObjHeader& rh = src.header();
-  bool same = rh.signature != 0 && rh.signature == x.objHeader.signature &&
-              src.mapSize() == x.map.size() && src.stringBytes() == x.strings.size();
-  if (same) {
+  bool sameVersion = rh.signature != 0 && rh.signature == x.objHeader.signature &&
+                     src.mapSize() == x.map.size() && src.stringBytes() == x.strings.size();
+  if (sameVersion && sameLayout(x, src)) {
     countMergeArrays(x, rh, src.map(), src.counts(), src.mapSize(), hitFlags_);
+  } else if (rh.signature != 0 && rh.signature == x.objHeader.signature) {
+    // One unchanged source captured with different line sets (a header inlined
+    // differently by two programs): both hold true data, so they are combined line by line,
+    // and the result still stands for that source.
+    std::unique_ptr<ObjRecord> merged = structuralMergeRecords(x, src.record(), hitFlags_);
+    merged->objHeader.signature = rh.signature;
+    merged->objHeader.buildTime = std::max(rh.buildTime, x.objHeader.buildTime);
+    replace(at, std::move(merged));
   } else if (mode != kMergeForce) {
     ignoredNow_ = true;
     if (ignored) ignored->emplace_back(src.name());

@@ -200,6 +200,64 @@ blockline 32
             "fn:delta:1 fl:25:0 b:26:1 bl:27:0 fn:gamma:3 fl:30:0 b:31:2 b:32:1 ");
 }
 
+TEST(Merging, OneSourceCapturedWithDifferentLinesIsCombinedLineByLineInEitherOrder) {
+  // A header inlined differently by two programs: the same source (signature), two maps.
+  TempDir dir;
+  std::string lib = makeKgv(dir, "lib.kgv", R"(
+record inc/h.h signature=77 build=300 first=1000 last=2000
+function get line=5 calls=4
+block 6 hits=4
+function put line=10 calls=1
+block 11 hits=1
+block 12 hits=0
+)");
+  std::string tests = makeKgv(dir, "tests.kgv", R"(
+record inc/h.h signature=77 build=300 first=1500 last=2500
+function get line=5 calls=2
+block 6 hits=2
+function size line=20 calls=3
+block 21 hits=3
+)");
+  const std::string combined = "F:inc/h.h:2 fn:get:6 fl:5:0 b:6:6 fn:put:1 fl:10:0 b:11:1 b:12:0 "
+                               "fn:size:3 fl:20:0 b:21:3 ";
+  for (auto order : {std::vector<std::string>{lib, tests}, std::vector<std::string>{tests, lib}}) {
+    Loaded l = loadAll(order, kMergeNewestWins);
+    ASSERT_EQ(l.rc, allOK) << "nothing is set aside";
+    EXPECT_TRUE(l.ignored.empty());
+    ASSERT_EQ(l.data->records.size(), 1u);
+    const ObjRecord& r = *l.data->records[0];
+    EXPECT_EQ(describeMap(r), combined);
+    EXPECT_EQ(r.objHeader.signature, 77u) << "still the same source";
+    EXPECT_EQ(r.objHeader.buildTime, 300u);
+    // A third capture of the same source merges in as well.
+    ASSERT_EQ(writeKgvFile(dir.file("both.kgv"), *l.data), allOK);
+    Loaded again = loadAll({dir.file("both.kgv"), tests}, kMergeNewestWins);
+    ASSERT_EQ(again.rc, allOK);
+    EXPECT_EQ(describeMap(*again.data->records[0]),
+              "F:inc/h.h:3 fn:get:8 fl:5:0 b:6:8 fn:put:1 fl:10:0 b:11:1 b:12:0 "
+              "fn:size:6 fl:20:0 b:21:6 ");
+  }
+}
+
+TEST(Merging, MapsOfEqualSizeButOtherLinesAreNotAddedPositionByPosition) {
+  TempDir dir;
+  std::string a = makeKgv(dir, "a.kgv", R"(
+record s.c signature=9 build=100
+function f line=1 calls=1
+block 2 hits=1
+block 3 hits=0
+)");
+  std::string b = makeKgv(dir, "b.kgv", R"(
+record s.c signature=9 build=100
+function f line=1 calls=1
+block 4 hits=5
+block 5 hits=0
+)");
+  Loaded l = loadAll({a, b}, kMergeNewestWins);
+  ASSERT_EQ(l.rc, allOK);
+  EXPECT_EQ(describeMap(*l.data->records[0]), "F:s.c:2 fn:f:2 fl:1:0 b:2:1 b:3:0 b:4:5 b:5:0 ");
+}
+
 TEST(Merging, JavaDataAfterCDataAreSetAsideWithAWarningToTheCaller) {
   TempDir dir;
   std::string c = makeKgv(dir, "c.kgv", kOld);
