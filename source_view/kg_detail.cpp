@@ -773,9 +773,9 @@ void KG_DetailWindows::summaryReplaced(SumRoot& summary) {
   SumFile* file = findSumFile(summary, w.model().summaryPath());
   if (!file) {
     const std::string name = w.model().summaryPath();
-    current_ = nullptr;
+    // Unsaved edits are asked about first; kept, the window stays until the user closes it.
     close(w);
-    show_message(OI_Severity::warning,
+    show_message(OI_Severity::information,
                  kgMessageText("fileNotKGVData", "This file is no longer part of the .kgv data") + ":\n" + name);
     return;
   }

@@ -11,6 +11,7 @@
 #include "summary/main_window.h"
 #include "support/diagnostic.h"
 #include "support/errors.h"
+#include "updates/kg_file_monitor.h"
 
 namespace {
 
@@ -58,6 +59,8 @@ ErrorCode showMainWindow(StartupState& s, StartupSummary& prepared) {
   input.adjustmentProblems = std::move(prepared.adjustmentProblems);
   KG_DetailWindows sourceWindows;
   input.sourceWindows = &sourceWindows;
+  KG_FileMonitor monitor;
+  input.dataWatcher = &monitor;
   std::string failure;
   ErrorCode rc = runMainWindow(input, failure);
   if (rc != allOK && !failure.empty()) reportError(rc, "%s", failure.c_str());

@@ -84,7 +84,9 @@ ErrorCode runMainWindow(MainWindowInput& input, std::string& failure) {
       frame.show();
       showLoadResult(input.loadStatus, input.ignored);
       if (!input.adjustmentProblems.empty()) noteList("Problems reading adjustments:", input.adjustmentProblems);
+      if (input.dataWatcher) input.dataWatcher->start(frame);
       app->run();
+      if (input.dataWatcher) input.dataWatcher->stop();
       // The source windows go before the main window and the display they live on.
       if (input.sourceWindows) input.sourceWindows->closeAll();
       setLockWaitCallback(previous);

@@ -12,6 +12,7 @@
 #include "coverage/kgv_file_ref.h"
 #include "coverage/kgv_merge.h"
 #include "coverage/summary_types.h"
+#include "summary/data_watcher.h"
 #include "summary/source_windows.h"
 #include "support/errors.h"
 
@@ -28,6 +29,7 @@ struct MainWindowInput {
   std::vector<std::string> ignored;       // source files whose older data were set aside
   std::vector<std::string> adjustmentProblems;
   KG_SourceWindows* sourceWindows = nullptr;  // the annotated source windows; not owned
+  KG_DataWatcher* dataWatcher = nullptr;      // the watch over the data files; not owned
 };
 
 // The toolkit opens the display (unless start-up opened it already) with the settings'

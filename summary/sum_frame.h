@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "coverage/kgv_data.h"
+#include "coverage/kgv_file_ref.h"
 #include "coverage/summary_types.h"
 #include "summary/main_window.h"
 #include "support/errors.h"
@@ -52,6 +53,8 @@ class KG_SumFrame {
   void set_sort_order(std::uint32_t order);
   void set_stripes(int setting);
   void set_toolbar_visible(bool on);
+  // The data files shown, with the times they were loaded.
+  std::vector<KgvFileRef>& loaded_files();
   // The File menu's data operations.
   void reload_all();
   void add_data_file(const std::string& path);

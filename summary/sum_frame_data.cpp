@@ -59,6 +59,8 @@ class WindowQuestion : public ExtractionQuestion {
 
 }  // namespace
 
+std::vector<KgvFileRef>& KG_SumFrame::loaded_files() { return input_.loadedFiles; }
+
 void KG_SumFrame::reload_all() {
   KG_SummaryOverall* all = overall();
   if (all == nullptr || input_.loadedFiles.empty()) return;

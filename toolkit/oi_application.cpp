@@ -1,8 +1,14 @@
 // The application: display connection, resource database, event loop, timers and busy pointer.
 #include "toolkit/oi_application.h"
 
+#include <X11/IntrinsicP.h>
+#include <X11/CompositeP.h>
+#include <X11/CoreP.h>
 #include <X11/Shell.h>
+#include <X11/ShellP.h>
 #include <X11/cursorfont.h>
+#include <Xm/DialogS.h>
+#include <Xm/MenuShell.h>
 #include <Xm/Xm.h>
 
 #include <algorithm>
@@ -183,6 +189,35 @@ void OI_Application::processPending() {
 }
 
 void OI_Application::noteUserActivity() { lastActivity_ = oiNowMs(); }
+
+bool OI_Application::anyWindowOpen() const {
+  for (Widget top : topLevels_) {
+    if (!XtIsRealized(top)) continue;
+    XWindowAttributes a;
+    if (XGetWindowAttributes(display_, XtWindow(top), &a) && a.map_state == IsViewable) return true;
+  }
+  return false;
+}
+
+namespace {
+
+Widget showingPopup(Widget w) {
+  if (w->core.being_destroyed) return nullptr;
+  if ((XmIsMenuShell(w) || XmIsDialogShell(w)) && reinterpret_cast<ShellWidget>(w)->shell.popped_up) return w;
+  if (XtIsComposite(w)) {
+    auto* cw = reinterpret_cast<CompositeWidget>(w);
+    for (Cardinal i = 0; i < cw->composite.num_children; ++i)
+      if (Widget found = showingPopup(cw->composite.children[i])) return found;
+  }
+  if (XtIsWidget(w))
+    for (Cardinal i = 0; i < w->core.num_popups; ++i)
+      if (Widget found = showingPopup(w->core.popup_list[i])) return found;
+  return nullptr;
+}
+
+}  // namespace
+
+Widget OI_Application::guiActionInProgress() const { return shell_ ? showingPopup(shell_) : nullptr; }
 
 OI_TimerHandle OI_Application::addTimeOut(unsigned long ms, std::function<void()> fn) {
   unsigned long id = nextTimer_++;

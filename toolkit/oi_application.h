@@ -93,6 +93,14 @@ class OI_Application {
   void endBusyPointer();
   int busyCount() const { return busyCount_; }
 
+  // Whether any of the registered top-level windows is on the screen (not iconified or
+  // withdrawn).
+  bool anyWindowOpen() const;
+  // A menu posted or a dialog showing anywhere under the application's windows, that is,
+  // the user is in the middle of something: that shell, or null. Menu bars belong to their
+  // windows and do not count; only their posted pulldowns do.
+  Widget guiActionInProgress() const;
+
   // Top-level windows register themselves so that the busy pointer and the test hook find them.
   void addTopLevel(Widget shell);
   void removeTopLevel(Widget shell);

@@ -8,6 +8,7 @@
 #include <Xm/RowColumn.h>
 #include <Xm/Separator.h>
 #include <Xm/TextF.h>
+#include <Xm/ToggleB.h>
 
 #include "toolkit/oi_window.h"
 #include "toolkit/oi_xstring.h"
@@ -127,12 +128,44 @@ OI_Frame::OI_Frame(Widget parent, const std::string& name, const std::string& ti
   XtManageChild(w);
 }
 
-OI_ScrolledList::OI_ScrolledList(Widget parent, const std::string& name, int visibleItems) {
-  Arg args[2];
+OI_OneOfMany::OI_OneOfMany(Widget parent, const std::string& name) {
+  Widget w = XmCreateRadioBox(parent, oiStr(name.c_str()), nullptr, 0);
+  adopt(w, name);
+  XtManageChild(w);
+}
+
+void OI_OneOfMany::addChoice(const std::string& name, const std::string& label) {
+  if (!widget()) return;
+  Widget t = XmCreateToggleButton(widget(), oiStr(name.c_str()), nullptr, 0);
+  oiLabelUnlessSet(t, label);
+  XtManageChild(t);
+  choices_.push_back(t);
+}
+
+int OI_OneOfMany::selected() const {
+  for (size_t i = 0; i < choices_.size(); ++i)
+    if (XmToggleButtonGetState(choices_[i])) return static_cast<int>(i);
+  return -1;
+}
+
+void OI_OneOfMany::select(int index) {
+  for (size_t i = 0; i < choices_.size(); ++i)
+    XmToggleButtonSetState(choices_[i], static_cast<int>(i) == index ? True : False, False);
+}
+
+OI_ScrolledList::OI_ScrolledList(Widget parent, const std::string& name, int visibleItems, int columns) {
+  Arg args[3];
   XtSetArg(args[0], XmNvisibleItemCount, visibleItems);
   XtSetArg(args[1], XmNselectionPolicy, XmBROWSE_SELECT);
-  Widget w = XmCreateScrolledList(parent, oiStr(name.c_str()), args, 2);
+  XtSetArg(args[2], XmNlistSizePolicy, columns > 0 ? XmCONSTANT : XmVARIABLE);
+  Widget w = XmCreateScrolledList(parent, oiStr(name.c_str()), args, 3);
   adopt(w, name);
+  XmRenderTable fonts = nullptr;
+  XtVaGetValues(w, XmNrenderTable, &fonts, nullptr);
+  if (columns > 0 && fonts) {
+    OI_XmString sample(std::string(static_cast<size_t>(columns), '0'));
+    XtVaSetValues(w, XmNwidth, XmStringWidth(fonts, sample), nullptr);
+  }
   XtAddCallback(w, XmNbrowseSelectionCallback, selectCB, this);
   XtAddCallback(w, XmNdefaultActionCallback, defaultCB, this);
   XtManageChild(w);

@@ -62,9 +62,25 @@ class OI_Frame : public OI_Widget {
   OI_Frame(Widget parent, const std::string& name, const std::string& title = {});
 };
 
+// One of several choices, as toggle buttons of which exactly one is set.
+class OI_OneOfMany : public OI_Widget {
+ public:
+  OI_OneOfMany(Widget parent, const std::string& name);
+  // A choice (a toggle button of that name); `label` unless a "labelString" resource says.
+  void addChoice(const std::string& name, const std::string& label);
+  // The set choice's index, -1 when none is.
+  int selected() const;
+  void select(int index);
+
+ private:
+  std::vector<Widget> choices_;
+};
+
 class OI_ScrolledList : public OI_Widget {
  public:
-  OI_ScrolledList(Widget parent, const std::string& name, int visibleItems = 8);
+  // With `columns`, the list keeps the width of that many characters of its font whatever
+  // its items; otherwise it follows its widest item.
+  OI_ScrolledList(Widget parent, const std::string& name, int visibleItems = 8, int columns = 0);
   void setItems(const std::vector<std::string>& items);
   std::vector<std::string> items() const;
   // -1 when nothing is selected.

@@ -157,6 +157,41 @@ void OI_MessageDialog::describe(std::ostream& out) const {
   out << " message=\"" << text << "\"\n";
 }
 
+// ------------------------------------------------------------------ custom dialog
+
+OI_CustomDialog::OI_CustomDialog(Widget parent, const std::string& name, const std::string& title) {
+  Widget d = makeTemplate(parentOrShell(parent), name, title, OI_Severity::plain);
+  adopt(d, name);
+  Arg args[1];
+  XtSetArg(args[0], XmNorientation, XmVERTICAL);
+  work_ = XmCreateRowColumn(d, oiStr((name + "Work").c_str()), args, 1);
+  XtManageChild(work_);
+}
+
+void OI_CustomDialog::addButton(const OI_DialogButton& button) {
+  if (!widget()) return;
+  Widget b = XmCreatePushButton(widget(), oiStr(button.name.c_str()), nullptr, 0);
+  oiLabelUnlessSet(b, button.label);
+  XtManageChild(b);
+  if (buttons_.empty()) XtVaSetValues(widget(), XmNdefaultButton, b, nullptr);
+  buttons_.push_back(b);
+}
+
+std::string OI_CustomDialog::run() {
+  Widget d = widget();
+  if (!d) return {};
+  Wait wait;
+  std::vector<std::unique_ptr<ButtonTag>> tags;
+  for (Widget b : buttons_) {
+    tags.push_back(std::make_unique<ButtonTag>(ButtonTag{&wait, XtName(b)}));
+    XtAddCallback(b, XmNactivateCallback, buttonCB, tags.back().get());
+  }
+  waitFor(d, wait);
+  for (size_t i = 0; i < buttons_.size(); ++i) XtRemoveCallback(buttons_[i], XmNactivateCallback, buttonCB, tags[i].get());
+  oiRestoreFocus(XtParent(d));
+  return wait.answer;
+}
+
 // ------------------------------------------------------------------ questions
 
 std::string oiAsk(Widget parent, const std::string& dialogName, const std::string& title, const std::string& text,

@@ -25,6 +25,23 @@ class OI_MessageDialog : public OI_Widget {
   void describe(std::ostream& out) const override;
 };
 
+// A dialog of the caller's own contents, made once and shown modally again and again.
+class OI_CustomDialog : public OI_Widget {
+ public:
+  OI_CustomDialog(Widget parent, const std::string& name, const std::string& title);
+  // A vertical box for the caller's children.
+  Widget workArea() const { return work_; }
+  // Buttons along the bottom, in order; the first is the default.
+  void addButton(const OI_DialogButton& button);
+  // Shows the dialog over its parent until a button is pressed: its name, or "" when the
+  // window was closed.
+  std::string run();
+
+ private:
+  Widget work_ = nullptr;
+  std::vector<Widget> buttons_;
+};
+
 // A question with the given buttons; returns the pressed button's name, "" when the window was
 // closed. The dialog is made for the question and destroyed after it.
 std::string oiAsk(Widget parent, const std::string& dialogName, const std::string& title, const std::string& text,

@@ -342,13 +342,21 @@ TEST_F(SourceWindow, ReloadedDataReachTheWindowAndAFileNoLongerThereClosesIt) {
   ASSERT_TRUE(app->waitFor([](const GuiState& s) { return s.find("kgCounts")->lines[7] == "   5"; }, &last))
       << app->errorOutput();
   EXPECT_EQ(last.find("kgLineNumbers")->number("current"), 8);
-  // Data without the file: the window goes and says why.
+  // Data without the file, while an edit is unsaved: asked first, then the window goes and
+  // says why.
+  int x, y;
+  panePoint("kgAdjustPane", 9, 4, x, y);
+  app->click(x, y);
+  ASSERT_TRUE(app->waitFor([](const GuiState& s) { return s.find("kgAdjustPane")->lines[8].back() == 'T'; }, &last));
   makeData(5, false);
   clickWidget("kestrel.mainWindow.kgTopMenu.kgFilePulldown");
   clickWidget("kgFile.kgReloadAll");
-  ASSERT_TRUE(app->waitViewable("kgWarningDialog", &last)) << app->errorOutput();
+  ASSERT_TRUE(app->waitViewable("kgSaveAndClose", &last)) << app->errorOutput();
+  clickWidget("kgCloseOnly");
+  ASSERT_TRUE(app->waitViewable("kgInformationDialog", &last)) << app->errorOutput();
   EXPECT_NE(last.raw().find("This file is no longer part of the .kgv data:"), std::string::npos);
   EXPECT_EQ(shells("kgAnnotatedSource"), 0);
+  EXPECT_EQ(readFile(source), kSource) << "closed without saving, as chosen";
 }
 
 TEST_F(SourceWindow, ASourceThatCannotBeWrittenIsShownReadOnly) {

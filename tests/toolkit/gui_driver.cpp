@@ -40,7 +40,8 @@ void GuiState::parse(const std::string& text) {
   std::istringstream in(text);
   std::string line;
   while (std::getline(in, line)) {
-    if (line.rfind("  line ", 0) == 0) {
+    // Text lines, and the items of lists.
+    if (line.rfind("  line ", 0) == 0 || line.rfind("  item: ", 0) == 0) {
       if (widgets_.empty()) continue;
       size_t colon = line.find(": ");
       widgets_.back().lines.push_back(colon == std::string::npos ? "" : line.substr(colon + 2));
