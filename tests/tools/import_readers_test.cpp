@@ -1,10 +1,14 @@
-// Reading lcov tracefiles and gcov JSON, laying the lines out as functions, and refusing
-// bad input with the file and line of the problem.
+// Reading lcov tracefiles and gcov JSON, their paths, names and branches, laying the lines
+// out as functions, and refusing bad input with the file and line of the problem.
 #include <gtest/gtest.h>
+#include <unistd.h>
 #include <zlib.h>
+
+#include <set>
 
 #include "tests/common/test_support.h"
 #include "tools/import/coverage_import.h"
+#include "tools/import/import_records.h"
 #include "tools/import/record_layout.h"
 
 namespace {
@@ -65,12 +69,22 @@ TEST(LcovTracefiles, BadInputNamesFileAndLine) {
   EXPECT_EQ(lcovError("SF:a.c\nDA:x,1\nend_of_record\n"), "t.info:2: malformed DA record 'x,1'");
   EXPECT_EQ(lcovError("DA:1,1\n"), "t.info:1: DA before any SF record");
   EXPECT_EQ(lcovError("SF:a.c\nDA:1,1\n"),
-            "t.info:3: the last record has no end_of_record (the file may be truncated)");
+            "t.info:3: the tracefile looks truncated: its last record has no end_of_record");
+  // Cut in the middle of a line: the line is named, and what it lacks.
+  EXPECT_EQ(lcovError("SF:a.c\nDA:1,1\nDA"),
+            "t.info:3: the tracefile looks truncated: its last line 'DA' is incomplete "
+            "(not a tracefile line: 'DA')");
+  EXPECT_EQ(lcovError("SF:a.c\nDA:1,1\nBRDA:1,0,"),
+            "t.info:3: the tracefile looks truncated: its last line 'BRDA:1,0,' is incomplete "
+            "(malformed BRDA record '1,0,')");
   EXPECT_EQ(lcovError("SF:a.c\nthis is not lcov\nend_of_record\n"),
             "t.info:2: not a tracefile line: 'this is not lcov'");
   EXPECT_EQ(lcovError("SF:a.c\nFNA:3,1,f\nend_of_record\n"),
             "t.info:2: FNA record for function index 3 without FNL");
   EXPECT_EQ(lcovError("SF:a.c\nDA:0,1\nend_of_record\n"), "t.info:2: malformed DA record '0,1'");
+  EXPECT_EQ(lcovError("SF:a.c\nBRDA:1,0,1\nend_of_record\n"), "t.info:2: malformed BRDA record '1,0,1'");
+  EXPECT_EQ(lcovError("SF:a.c\nBRDA:0,0,1,1\nend_of_record\n"), "t.info:2: malformed BRDA record '0,0,1,1'");
+  EXPECT_EQ(lcovError("SF:a.c\nBRDA:2,0,1,x\nend_of_record\n"), "t.info:2: malformed BRDA record '2,0,1,x'");
   // Huge counts saturate instead of being refused.
   ImportedData d = lcov("SF:a.c\nDA:1,99999999999999999999999\nend_of_record\n");
   EXPECT_EQ(saturatedCount(d.files[0].lines.at(1)), 10000u);
@@ -86,12 +100,14 @@ TEST(GcovJson, DocumentsFilesFunctionsAndLines) {
   ASSERT_TRUE(readGcovJson("a.json", doc + "\n" + doc + "\n", d, e)) << e.text();
   ASSERT_EQ(d.files.size(), 1u);
   EXPECT_EQ(d.files[0].path, "/build/src/a.c");
-  EXPECT_EQ(d.files[0].function("f(int)").calls, 6u);
+  EXPECT_EQ(d.files[0].function("_Z1fi").calls, 6u);
+  EXPECT_EQ(d.files[0].function("_Z1fi").name, "f(int)");
   EXPECT_EQ(d.files[0].lines.at(3), 6u);
 }
 
 TEST(GcovJson, BadDocumentsNameTheLine) {
   ImportedData d;
+  d.baseDirectory = "/w";
   ImportError e;
   EXPECT_FALSE(readGcovJson("b.json", "{\"files\": [\n{\"file\": \"a.c\",\n \"lines\": [oops]}]}", d, e));
   EXPECT_EQ(e.line, 3u);
@@ -99,9 +115,12 @@ TEST(GcovJson, BadDocumentsNameTheLine) {
   EXPECT_FALSE(readGcovJson("c.json", "{\"files\": 3}", d, e));
   EXPECT_EQ(e.text(), "c.json:1: not gcov JSON: no \"files\" array");
   EXPECT_FALSE(readGcovJson("d.json", "{\"files\":[{\"file\":\"a.c\",\"lines\":[{\"count\":1}]}]}", d, e));
-  EXPECT_EQ(e.text(), "d.json:1: a line entry of a.c has no line number or count");
+  EXPECT_EQ(e.text(), "d.json:1: a line entry of /w/a.c has no line number or count");
   EXPECT_FALSE(readGcovJson("e.json", "{\"files\":[{\"file\":\"a.c\"", d, e));
-  EXPECT_EQ(e.text().rfind("e.json:1: not valid JSON", 0), 0u) << e.text();
+  EXPECT_EQ(e.text().rfind("e.json:1: the gcov JSON looks truncated (not valid JSON", 0), 0u) << e.text();
+  EXPECT_FALSE(readGcovJson("f.json", "{\"files\":[{\"file\":\"/a.c\",\"lines\":[{\"line_number\":1,"
+                                      "\"count\":1,\"branches\":7}]}]}", d, e));
+  EXPECT_EQ(e.text(), "f.json:1: \"branches\" of a line of /a.c is not an array");
 }
 
 // A data file ends names at a NUL, so a name holding one would name another file or
@@ -195,4 +214,143 @@ TEST(Inputs, CompressedAndPlainFilesReadAlikeAndFormatsAreRecognised) {
   EXPECT_FALSE(readInputText(dir.file("cut.gz"), a, e));
   EXPECT_FALSE(readInputText(dir.file("missing.info"), a, e));
   EXPECT_EQ(e.text().rfind(dir.file("missing.info") + ": cannot open", 0), 0u);
+}
+
+TEST(Paths, DotsDoubledSlashesAndRelativePathsAreResolved) {
+  EXPECT_EQ(normalisedSourcePath("/b/obj/../../zlib//adler32.c", ""), "/zlib/adler32.c");
+  EXPECT_EQ(normalisedSourcePath("./src/./a.c", "/w/build/"), "/w/build/src/a.c");
+  EXPECT_EQ(normalisedSourcePath("../../src/a.c", "/w/obj/sub"), "/w/src/a.c");
+  EXPECT_EQ(normalisedSourcePath("/../../a.c", "/w"), "/a.c");  // above the root is the root
+  EXPECT_EQ(normalisedSourcePath("a.c", "rel/dir"), normalisedSourcePath("rel/dir/a.c", ""));
+  char cwd[4096];
+  ASSERT_NE(getcwd(cwd, sizeof cwd), nullptr);
+  EXPECT_EQ(normalisedSourcePath("x/../a.c", ""), std::string(cwd) + "/a.c");
+
+  // Tracefiles take relative names from the base directory, gcov JSON from its own.
+  ImportedData d;
+  d.baseDirectory = "/base";
+  ImportError e;
+  ASSERT_TRUE(readLcovTracefile("t.info", "SF:src/../a.c\nDA:1,1\nend_of_record\nSF:/base/a.c\nDA:2,1\nend_of_record\n", d, e));
+  ASSERT_TRUE(readGcovJson("t.json", R"j({"current_working_directory":"/base/obj","files":[{"file":"../a.c","lines":[{"line_number":3,"count":1}]}]})j", d, e));
+  ASSERT_TRUE(readGcovJson("u.json", R"j({"files":[{"file":"a.c","lines":[{"line_number":4,"count":1}]}]})j", d, e));
+  ASSERT_EQ(d.files.size(), 1u);
+  EXPECT_EQ(d.files[0].path, "/base/a.c");
+  EXPECT_EQ(d.files[0].lines.size(), 4u);
+}
+
+TEST(Names, CxxNamesAreDemangledAndVariantsThatDemangleAlikeStayApart) {
+  ImportedData d = lcov(
+      "SF:/s/shape.cc\nFN:4,_ZN5ShapeD0Ev\nFN:4,_ZN5ShapeD2Ev\nFN:9,_Z4overd\nFN:10,_Z4overi\n"
+      "FN:12,main\nFN:14,f\nFNDA:1,_ZN5ShapeD2Ev\nDA:4,1\nend_of_record\n");
+  const ImportedFile& f = d.files[0];
+  std::vector<std::string> names;
+  for (const auto& fn : f.functions) names.push_back(fn.name);
+  // "f" alone is no C++ name, though the demangler would read it as the type "float".
+  EXPECT_EQ(names, (std::vector<std::string>{"Shape::~Shape() [D0]", "Shape::~Shape() [D2]",
+                                             "over(double)", "over(int)", "main", "f"}));
+
+  // The same functions from gcov JSON: the mangled name decides, so the same names.
+  ImportedData j;
+  ImportError e;
+  ASSERT_TRUE(readGcovJson("s.json",
+      R"j({"files":[{"file":"/s/shape.cc","functions":[)j"
+      R"j({"name":"_ZN5ShapeD2Ev","demangled_name":"Shape::~Shape()","start_line":4,"end_line":4,"execution_count":1},)j"
+      R"j({"name":"_ZN5ShapeD0Ev","demangled_name":"Shape::~Shape()","start_line":4,"end_line":4,"execution_count":0}]}]})j",
+      j, e)) << e.text();
+  ASSERT_EQ(j.files[0].functions.size(), 2u);
+  EXPECT_EQ(j.files[0].function("_ZN5ShapeD0Ev").name, "Shape::~Shape() [D0]");
+  EXPECT_EQ(j.files[0].function("_ZN5ShapeD2Ev").name, "Shape::~Shape() [D2]");
+
+  // Crafted names that meet a demangled one still come out distinct.
+  ImportedData c = lcov("SF:/s/c.cc\nFN:1,_Z4overd\nFN:2,over(double)\nFN:3,over(double) [_Z4overd]\nend_of_record\n");
+  std::set<std::string> distinct;
+  for (const auto& fn : c.files[0].functions) distinct.insert(fn.name);
+  EXPECT_EQ(distinct.size(), 3u);
+  EXPECT_EQ(c.files[0].function("over(double)").name, "over(double)");
+}
+
+TEST(Branches, TracefileAndJsonOutcomesAddUpByLineAndPlace) {
+  ImportedData d = lcov(
+      "SF:/s/b.c\nDA:3,4\nBRDA:3,0,1,2\nBRDA:3,0,0,-\nBRDA:3,0,10,1\nBRDA:3,1,0,0\nBRDA:3,1,1,9\nDA:5,0\n"
+      "BRDA:9,0,0,1\nBRDA:5,0,2,1\n"
+      "end_of_record\nSF:/s/b.c\nBRDA:3,0,0,3\nend_of_record\n");
+  ImportError e;
+  ASSERT_TRUE(readGcovJson("b.json",
+      R"j({"files":[{"file":"/s/b.c","lines":[{"line_number":3,"count":1,"branches":[{"count":1},{"count":0,"throw":true}]},)j"
+      R"j({"line_number":5,"count":0,"branches":[{"count":0},{"count":0}]}]}]})j", d, e)) << e.text();
+  const ImportedFile& f = d.files[0];
+  std::vector<std::pair<std::string, std::uint64_t>> line3;
+  for (const auto& [key, taken] : f.branches.at(3)) line3.emplace_back(key.block + "," + key.branch, taken);
+  EXPECT_EQ(line3, (std::vector<std::pair<std::string, std::uint64_t>>{
+                       {"0,0", 4}, {"0,1", 2}, {"0,10", 1}, {"1,0", 0}, {"1,1", 9}}));
+  EXPECT_EQ(f.lines.at(3), 5u);
+
+  // Laid out after the line's own count, never above it (merged or odd data: 9 on a line run
+  // 5 times, 1 on a line never run); an outcome at a line without a count (line 9) would
+  // add a line, so it is left out.
+  LaidOutRecord r = layOutRecord(f);
+  ASSERT_EQ(r.functions.size(), 1u);
+  ASSERT_EQ(r.functions[0].lines.size(), 2u);
+  EXPECT_EQ(r.functions[0].lines[0].branches, (std::vector<std::uint16_t>{4, 2, 1, 0, 5}));
+  EXPECT_EQ(r.functions[0].lines[1].branches, (std::vector<std::uint16_t>{0, 0, 0}));
+
+  std::unique_ptr<KgvData> kgv = makeImportedData(d, 1700000000);
+  const ObjRecord& rec = *kgv->records[0];
+  std::vector<std::pair<std::uint32_t, std::uint16_t>> blocks;
+  for (size_t i = 0; i < rec.map.size(); ++i)
+    if (mapTag(rec.map[i]) == TagBlock) blocks.emplace_back(mapValue(rec.map[i]), rec.counts[i]);
+  EXPECT_EQ(blocks, (std::vector<std::pair<std::uint32_t, std::uint16_t>>{
+                        {3, 5}, {3, 4}, {3, 2}, {3, 1}, {3, 0}, {3, 5}, {5, 0}, {5, 0}, {5, 0}, {5, 0}}));
+}
+
+TEST(Layout, FunctionsSharingTheirFirstLineGiveItsLinesToOneCalledFunction) {
+  // Six functions a macro writes on two lines, then one of their own.
+  auto make = [](bool withEnds) {
+    ImportedFile f;
+    f.path = "/s/m.c";
+    struct { const char* key; std::uint32_t line; std::uint64_t calls; } fs[] = {
+        {"alpha_get", 6, 2}, {"alpha_set", 6, 1}, {"alpha_clear", 6, 0},
+        {"beta_get", 7, 0},  {"beta_set", 7, 0},  {"beta_clear", 7, 1}, {"main", 8, 1}};
+    for (const auto& x : fs) {
+      ImportedFunction& fn = f.function(x.key);
+      fn.startLine = x.line;
+      fn.endLine = withEnds ? (x.line == 8 ? 12 : x.line) : 0;
+      fn.calls = x.calls;
+    }
+    for (std::uint32_t l : {6u, 7u, 9u, 10u}) f.addLine(l, 3);
+    return f;
+  };
+  LaidOutRecord r = layOutRecord(make(true));
+  EXPECT_EQ(lines(fn(r, "alpha_get")), (std::vector<std::uint32_t>{6}));  // first called in key order
+  EXPECT_EQ(lines(fn(r, "alpha_clear")), (std::vector<std::uint32_t>{}));
+  EXPECT_EQ(lines(fn(r, "alpha_set")), (std::vector<std::uint32_t>{}));
+  EXPECT_EQ(fn(r, "alpha_set").firstLine, 6u);
+  EXPECT_EQ(fn(r, "alpha_set").calls, 1u);
+  EXPECT_EQ(lines(fn(r, "beta_clear")), (std::vector<std::uint32_t>{7}));
+  EXPECT_EQ(lines(fn(r, "main")), (std::vector<std::uint32_t>{9, 10}));
+  // Without known ends (lcov 1.x tracefiles) the same.
+  LaidOutRecord u = layOutRecord(make(false));
+  ASSERT_EQ(u.functions.size(), r.functions.size());
+  for (size_t i = 0; i < r.functions.size(); ++i) {
+    EXPECT_EQ(u.functions[i].name, r.functions[i].name);
+    EXPECT_EQ(lines(u.functions[i]), lines(r.functions[i]));
+  }
+}
+
+TEST(Inputs, ImportsAddedTogetherEqualOneImportOfAllInputs) {
+  const char* a = "SF:/s/a.c\nFN:1,_Z1fv\nFNDA:2,_Z1fv\nDA:2,2\nBRDA:2,0,0,1\nend_of_record\n";
+  const char* b = "SF:/s/a.c\nFN:1,_Z1fv\nFN:5,_Z1gv\nFNDA:1,_Z1fv\nDA:2,1\nDA:6,0\nBRDA:2,0,1,1\nend_of_record\n";
+  ImportedData one, first, second;
+  ImportError e;
+  ASSERT_TRUE(readLcovTracefile("a", a, one, e));
+  ASSERT_TRUE(readLcovTracefile("b", b, one, e));
+  ASSERT_TRUE(readLcovTracefile("a", a, first, e));
+  ASSERT_TRUE(readLcovTracefile("b", b, second, e));
+  addImportedData(first, second);
+  auto k1 = makeImportedData(one, 1), k2 = makeImportedData(first, 1);
+  ASSERT_EQ(k1->records.size(), 1u);
+  ASSERT_EQ(k2->records.size(), 1u);
+  EXPECT_EQ(k1->records[0]->map, k2->records[0]->map);
+  EXPECT_EQ(k1->records[0]->counts, k2->records[0]->counts);
+  EXPECT_EQ(k1->records[0]->strings, k2->records[0]->strings);
 }

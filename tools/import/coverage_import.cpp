@@ -1,25 +1,128 @@
-// The neutral import model, reading compressed or plain inputs, and format detection.
+// The neutral import model and its names and paths, reading compressed or plain inputs,
+// and format detection.
 #include "tools/import/coverage_import.h"
 
+#include <cxxabi.h>
+#include <limits.h>
 #include <sys/stat.h>
+#include <unistd.h>
 #include <zlib.h>
 
 #include <algorithm>
 #include <cerrno>
 #include <cstdint>
+#include <cstdlib>
 #include <cstring>
+#include <string_view>
 
-ImportedFunction& ImportedFile::function(const std::string& name) {
-  auto it = functionIndex.find(name);
+ImportedFunction& ImportedFile::function(const std::string& key) {
+  auto it = functionIndex.find(key);
   if (it != functionIndex.end()) return functions[it->second];
-  functionIndex.emplace(name, functions.size());
-  functions.push_back(ImportedFunction{name, 0, 0, 0});
+  functionIndex.emplace(key, functions.size());
+  functions.push_back(ImportedFunction{key, key, 0, 0, 0});
+  namesDue = true;
   return functions.back();
 }
 
 void ImportedFile::addLine(std::uint32_t line, std::uint64_t hits) {
   auto [it, inserted] = lines.emplace(line, hits);
   if (!inserted) it->second = addCounts(it->second, hits);
+}
+
+void ImportedFile::addBranch(std::uint32_t line, const BranchKey& key, std::uint64_t taken) {
+  auto [it, inserted] = branches[line].emplace(key, taken);
+  if (!inserted) it->second = addCounts(it->second, taken);
+}
+
+namespace {
+
+bool allDigits(const std::string& s) {
+  return !s.empty() && std::all_of(s.begin(), s.end(), [](char c) { return c >= '0' && c <= '9'; });
+}
+
+// -1, 0 or 1; numbers (of any length) before words, in numeric order.
+int compareWords(const std::string& a, const std::string& b) {
+  bool na = allDigits(a), nb = allDigits(b);
+  if (na != nb) return na ? -1 : 1;
+  if (na) {
+    size_t za = std::min(a.find_first_not_of('0'), a.size() - 1);
+    size_t zb = std::min(b.find_first_not_of('0'), b.size() - 1);
+    size_t la = a.size() - za, lb = b.size() - zb;
+    if (la != lb) return la < lb ? -1 : 1;
+    int c = a.compare(za, la, b, zb, lb);
+    if (c != 0) return c < 0 ? -1 : 1;
+  }
+  int c = a.compare(b);
+  return c < 0 ? -1 : c > 0 ? 1 : 0;
+}
+
+// What tells two C++ names that demangle alike apart: the constructor or destructor variant
+// ("D0" for the deleting destructor, "C1" for the complete-object constructor...) where the
+// names differ only in it, else the mangled name itself.
+std::string variantOf(const std::string& key, const std::string& other) {
+  size_t i = 0;
+  while (i < key.size() && i < other.size() && key[i] == other[i]) ++i;
+  auto digit = [](const std::string& s, size_t at) { return at < s.size() && s[at] >= '0' && s[at] <= '9'; };
+  if (i >= 1 && digit(key, i) && digit(other, i)) {
+    if (key[i - 1] == 'C' || key[i - 1] == 'D') return key.substr(i - 1, 2);
+    if (i >= 2 && key[i - 1] == 'I' && key[i - 2] == 'C') return key.substr(i - 2, 3);  // inheriting constructors
+  }
+  return key;
+}
+
+void nameFileFunctions(ImportedFile& file) {
+  std::vector<std::string> base;
+  base.reserve(file.functions.size());
+  std::unordered_map<std::string, std::vector<size_t>> byBase;
+  for (size_t i = 0; i < file.functions.size(); ++i) {
+    base.push_back(demangledName(file.functions[i].key));
+    byBase[base.back()].push_back(i);
+  }
+  for (size_t i = 0; i < file.functions.size(); ++i) {
+    ImportedFunction& f = file.functions[i];
+    const std::vector<size_t>& same = byBase[base[i]];
+    // A name that was not mangled keeps its form; the demangled ones beside it say which
+    // variant they are.
+    if (same.size() == 1 || f.key == base[i]) {
+      f.name = base[i];
+      continue;
+    }
+    size_t other = same[0] == i ? same[1] : same[0];
+    f.name = base[i] + " [" + variantOf(f.key, file.functions[other].key) + "]";
+  }
+  // Names that still meet (only crafted ones can) take their key, then a number.
+  std::unordered_map<std::string, size_t> taken;
+  for (size_t i = 0; i < file.functions.size(); ++i) {
+    ImportedFunction& f = file.functions[i];
+    if (taken.emplace(f.name, i).second) continue;
+    std::string candidate = base[i] + " [" + f.key + "]";
+    for (unsigned n = 2; !taken.emplace(candidate, i).second; ++n)
+      candidate = base[i] + " [" + f.key + "] #" + std::to_string(n);
+    f.name = candidate;
+  }
+  file.namesDue = false;
+}
+
+}  // namespace
+
+bool BranchOrder::operator()(const BranchKey& a, const BranchKey& b) const {
+  int c = compareWords(a.block, b.block);
+  if (c != 0) return c < 0;
+  return compareWords(a.branch, b.branch) < 0;
+}
+
+std::string demangledName(const std::string& key) {
+  // Only names of the C++ ABI: the demangler reads "f" as the type "float".
+  if (key.compare(0, 2, "_Z") != 0) return key;
+  int status = 0;
+  char* text = abi::__cxa_demangle(key.c_str(), nullptr, nullptr, &status);
+  if (status != 0 || !text) {
+    free(text);
+    return key;
+  }
+  std::string shown(text);
+  free(text);
+  return shown;
 }
 
 ImportedFile& ImportedData::file(const std::string& path) {
@@ -29,6 +132,64 @@ ImportedFile& ImportedData::file(const std::string& path) {
   files.emplace_back();
   files.back().path = path;
   return files.back();
+}
+
+void ImportedData::nameFunctions() {
+  for (ImportedFile& f : files)
+    if (f.namesDue) nameFileFunctions(f);
+}
+
+void addImportedData(ImportedData& into, const ImportedData& from) {
+  for (const ImportedFile& src : from.files) {
+    ImportedFile& dst = into.file(src.path);
+    for (const ImportedFunction& f : src.functions) {
+      ImportedFunction& g = dst.function(f.key);
+      if (g.startLine == 0) g.startLine = f.startLine;
+      if (g.endLine == 0) g.endLine = f.endLine;
+      g.calls = addCounts(g.calls, f.calls);
+    }
+    for (const auto& [line, hits] : src.lines) dst.addLine(line, hits);
+    for (const auto& [line, outcomes] : src.branches)
+      for (const auto& [key, taken] : outcomes) dst.addBranch(line, key, taken);
+    dst.runs = addCounts(dst.runs, src.runs);
+  }
+  into.nameFunctions();
+}
+
+std::string normalisedSourcePath(const std::string& path, const std::string& base) {
+  std::string full = path;
+  if (full.empty() || full[0] != '/') {
+    std::string dir = base;
+    if (dir.empty() || dir[0] != '/') {
+      char cwd[PATH_MAX];
+      if (getcwd(cwd, sizeof cwd) && cwd[0] == '/')
+        dir = dir.empty() ? std::string(cwd) : std::string(cwd) + "/" + dir;
+    }
+    // Without a usable working directory a relative path stays relative.
+    if (!dir.empty() && dir[0] == '/') full = dir + "/" + full;
+  }
+  const bool absolute = !full.empty() && full[0] == '/';
+  std::vector<std::string_view> parts;
+  std::string_view rest(full);
+  while (!rest.empty()) {
+    size_t slash = rest.find('/');
+    std::string_view part = rest.substr(0, slash);
+    rest = slash == std::string_view::npos ? std::string_view() : rest.substr(slash + 1);
+    if (part.empty() || part == ".") continue;
+    if (part == ".." && !parts.empty() && parts.back() != "..") {
+      parts.pop_back();
+      continue;
+    }
+    if (part == ".." && absolute) continue;  // above the root is the root
+    parts.push_back(part);
+  }
+  std::string out;
+  for (std::string_view p : parts) {
+    if (absolute || !out.empty()) out += '/';
+    out += p;
+  }
+  if (out.empty()) return absolute ? "/" : ".";
+  return out;
 }
 
 std::string ImportError::text() const {

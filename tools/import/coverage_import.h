@@ -1,5 +1,6 @@
 // Coverage from other tools (lcov tracefiles, gcov JSON) in a neutral form: per source
-// file its functions with their lines and calls, and the hit count of every instrumented line.
+// file its functions with their lines and calls, the hit count of every instrumented line
+// and the taken count of every branch outcome.
 #pragma once
 
 #include <cstdint>
@@ -9,29 +10,64 @@
 #include <vector>
 
 struct ImportedFunction {
-  std::string name;
+  std::string name;  // as shown: demangled, with its variant when two demangle alike
+  std::string key;   // identity: the name as the input gives it (mangled for C++)
   std::uint32_t startLine = 0;
   std::uint32_t endLine = 0;  // 0 when the input does not say
   std::uint64_t calls = 0;
 };
 
+// A branch outcome within its line: lcov's block and branch numbers (gcov JSON's are 0 and
+// the outcome's place in the line's list, as lcov makes them).
+struct BranchKey {
+  std::string block;
+  std::string branch;
+};
+
+// Numbers in numeric order, then other words in byte order.
+struct BranchOrder {
+  bool operator()(const BranchKey& a, const BranchKey& b) const;
+};
+
+using LineBranches = std::map<BranchKey, std::uint64_t, BranchOrder>;
+
 struct ImportedFile {
   std::string path;
-  std::vector<ImportedFunction> functions;              // in order of first appearance
-  std::unordered_map<std::string, size_t> functionIndex;  // by name
-  std::map<std::uint32_t, std::uint64_t> lines;         // line -> hits
-  std::uint64_t runs = 0;                               // 0 when the input does not say
+  std::vector<ImportedFunction> functions;                // in order of first appearance
+  std::unordered_map<std::string, size_t> functionIndex;  // by key
+  std::map<std::uint32_t, std::uint64_t> lines;           // line -> hits
+  std::map<std::uint32_t, LineBranches> branches;         // line -> outcome -> times taken
+  std::uint64_t runs = 0;                                 // 0 when the input does not say
+  bool namesDue = false;                                  // functions added since naming
 
-  ImportedFunction& function(const std::string& name);
+  // The function of that key, added when new.
+  ImportedFunction& function(const std::string& key);
   void addLine(std::uint32_t line, std::uint64_t hits);
+  void addBranch(std::uint32_t line, const BranchKey& key, std::uint64_t taken);
 };
 
 struct ImportedData {
   std::vector<ImportedFile> files;  // in order of first appearance
   std::unordered_map<std::string, size_t> fileIndex;
+  // Where relative source paths of tracefiles (and of gcov JSON that names no working
+  // directory) are taken from; empty: the current directory.
+  std::string baseDirectory;
 
   ImportedFile& file(const std::string& path);
+  // Gives the functions added since the last call their shown names; the readers call it
+  // when they have read an input.
+  void nameFunctions();
 };
+
+// Adds everything `from` holds to `into`, as reading its inputs after `into`'s would have.
+void addImportedData(ImportedData& into, const ImportedData& from);
+
+// The name shown for a function: C++ names demangled, others as they are.
+std::string demangledName(const std::string& key);
+
+// The absolute, lexically normalised form of a source path ("." and ".." resolved, no
+// doubled "/"); a relative path is taken from `base` (itself made absolute first).
+std::string normalisedSourcePath(const std::string& path, const std::string& base);
 
 // Where and why an input could not be read.
 struct ImportError {
@@ -47,8 +83,9 @@ bool readInputText(const std::string& path, std::string& text, ImportError& erro
 enum class InputFormat { lcov, gcovJson, unknown };
 InputFormat detectFormat(const std::string& text);
 
-// Each adds what the input holds to `data` (several inputs add up). The directory makes
-// relative source paths absolute when the input gives one (gcov's working directory).
+// Each adds what the input holds to `data` (several inputs add up). Relative source paths
+// are taken from gcov's working directory when the input names one, else from
+// data.baseDirectory.
 bool readLcovTracefile(const std::string& name, const std::string& text, ImportedData& data,
                        ImportError& error);
 bool readGcovJson(const std::string& name, const std::string& text, ImportedData& data,

@@ -66,13 +66,6 @@ bool lineField(const json& obj, const char* key, std::uint32_t& line) {
   return true;
 }
 
-std::string absolute(const std::string& path, const std::string& dir) {
-  if (path.empty() || path[0] == '/' || dir.empty()) return path;
-  std::string p = path;
-  while (p.compare(0, 2, "./") == 0) p.erase(0, 2);
-  return dir.back() == '/' ? dir + p : dir + "/" + p;
-}
-
 struct Reader {
   const std::string& name;
   const std::string& text;
@@ -93,7 +86,11 @@ struct Reader {
                         text.begin() + static_cast<std::ptrdiff_t>(end));
     } catch (const json::parse_error& e) {
       size_t at = e.byte == 0 ? start : start + e.byte - 1;
-      return fail(at, std::string("not valid JSON: ") + (strchr(e.what(), ':') ? strchr(e.what(), ':') + 2 : e.what()));
+      std::string what = std::string("not valid JSON: ") + (strchr(e.what(), ':') ? strchr(e.what(), ':') + 2 : e.what());
+      // Stopped by the end of the whole input: the file was most likely cut short.
+      if (at + 1 >= text.size() && text.find_first_not_of(" \t\r\n", end) == std::string::npos)
+        return fail(at, "the gcov JSON looks truncated (" + what + ")");
+      return fail(at, what);
     }
     if (!doc.is_object()) return fail(start, "a gcov JSON document must be an object");
     auto files = doc.find("files");
@@ -110,7 +107,7 @@ struct Reader {
         return fail(start, "a file entry has no \"file\" name");
       // JSON may spell a NUL ("\u0000"), but the data file ends names there: a name cut
       // short would stand for another file, or for none.
-      std::string full = absolute(path->get<std::string>(), cwd);
+      std::string full = normalisedSourcePath(path->get<std::string>(), cwd.empty() ? data.baseDirectory : cwd);
       if (full.find('\0') != std::string::npos) return fail(start, "a file name holds a NUL character");
       ImportedFile& file = data.file(full);
 
@@ -119,8 +116,10 @@ struct Reader {
         if (!funcs->is_array()) return fail(start, "\"functions\" of " + file.path + " is not an array");
         for (const json& fn : *funcs) {
           if (!fn.is_object()) return fail(start, "a function entry of " + file.path + " is not an object");
+          // The mangled name is the identity: C++ variants (a deleting and a base destructor,
+          // say) demangle alike but are functions of their own, as lcov counts them.
           std::string fname;
-          for (const char* key : {"demangled_name", "name"}) {
+          for (const char* key : {"name", "demangled_name"}) {
             auto it = fn.find(key);
             if (fname.empty() && it != fn.end() && it->is_string()) fname = it->get<std::string>();
           }
@@ -148,6 +147,17 @@ struct Reader {
               !unsignedField(ln, "count", hits))
             return fail(start, "a line entry of " + file.path + " has no line number or count");
           file.addLine(number, hits);
+          // Each outcome as lcov numbers it: block 0, its place in the line's list.
+          auto branches = ln.find("branches");
+          if (branches == ln.end()) continue;
+          if (!branches->is_array()) return fail(start, "\"branches\" of a line of " + file.path + " is not an array");
+          size_t place = 0;
+          for (const json& br : *branches) {
+            std::uint64_t taken = 0;
+            if (!br.is_object()) return fail(start, "a branch of line " + std::to_string(number) + " of " + file.path + " is not an object");
+            unsignedField(br, "count", taken);
+            file.addBranch(number, BranchKey{"0", std::to_string(place++)}, taken);
+          }
         }
       }
     }
@@ -167,9 +177,11 @@ bool readGcovJson(const std::string& name, const std::string& text, ImportedData
       return false;
     }
     Reader r{name, text, data, error};
+    bool ok = true;
     for (auto [start, end] : docs)
-      if (!r.document(start, end)) return false;
-    return true;
+      if (!(ok = r.document(start, end))) break;
+    data.nameFunctions();
+    return ok;
   } catch (const std::exception& e) {
     // Anything the JSON library throws on odd input ends here, never further up.
     error = {name, 0, std::string("cannot read gcov JSON: ") + e.what()};

@@ -1,8 +1,11 @@
 // Building data records from imported coverage.
 #include "tools/import/import_records.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
+#include <cerrno>
 #include <unordered_map>
 
 namespace {
@@ -29,6 +32,50 @@ class StringArea {
   std::unordered_map<std::string, std::uint32_t> offsets_;
 };
 
+struct SourceFacts {
+  bool exists = false;    // its modification time is known
+  bool readable = false;  // its signature is of its content
+  std::uint32_t mtime = 0;
+  std::uint32_t signature = 0;
+};
+
+SourceFacts sourceFacts(const std::string& path) {
+  SourceFacts f;
+  int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
+  struct stat st;
+  if (fd < 0) {
+    if (stat(path.c_str(), &st) == 0) {
+      f.exists = true;
+      f.mtime = static_cast<std::uint32_t>(st.st_mtime);
+    }
+    return f;
+  }
+  if (fstat(fd, &st) != 0 || !S_ISREG(st.st_mode)) {
+    close(fd);
+    return f;
+  }
+  f.exists = true;
+  f.mtime = static_cast<std::uint32_t>(st.st_mtime);
+  // FNV-1a over the bytes, 64 bits folded to the record's 32.
+  std::uint64_t h = 14695981039346656037ull;
+  char buf[1 << 16];
+  for (;;) {
+    ssize_t n = read(fd, buf, sizeof buf);
+    if (n < 0 && errno == EINTR) continue;
+    if (n < 0) {
+      close(fd);
+      return f;
+    }
+    if (n == 0) break;
+    for (ssize_t i = 0; i < n; ++i) h = (h ^ static_cast<unsigned char>(buf[i])) * 1099511628211ull;
+  }
+  close(fd);
+  std::uint32_t folded = static_cast<std::uint32_t>(h ^ (h >> 32));
+  f.signature = folded == 0 ? 1 : folded;
+  f.readable = true;
+  return f;
+}
+
 }  // namespace
 
 std::unique_ptr<ObjRecord> makeImportedRecord(const LaidOutRecord& rec, std::uint32_t buildTime,
@@ -44,7 +91,10 @@ std::unique_ptr<ObjRecord> makeImportedRecord(const LaidOutRecord& rec, std::uin
   for (const auto& f : rec.functions) {
     push(TagFunction, strings.add(f.name), f.calls);
     if (f.firstLine != 0) push(TagFuncLine, f.firstLine, 0);
-    for (const auto& l : f.lines) push(TagBlock, l.line, l.hits);
+    for (const auto& l : f.lines) {
+      push(TagBlock, l.line, l.hits);
+      for (std::uint16_t taken : l.branches) push(TagBlock, l.line, taken);
+    }
   }
   r->strings = strings.take();
   r->objHeader.signature = rec.signature;
@@ -60,11 +110,13 @@ std::unique_ptr<KgvData> makeImportedData(const ImportedData& data, std::uint32_
   auto d = std::make_unique<KgvData>();
   for (const auto& file : data.files) {
     LaidOutRecord rec = layOutRecord(file);
-    // The compiled version is the source as it was last written: a second later than that is
-    // the build, so that only a source changed since then counts as newer than its data.
-    struct stat st;
-    std::uint32_t build = stat(file.path.c_str(), &st) == 0 ? static_cast<std::uint32_t>(st.st_mtime) + 1
-                                                             : importTime;
+    // The signature says which source the data are of: its content, so that captures of an
+    // unchanged source merge as one version whatever lines each holds.
+    SourceFacts src = sourceFacts(file.path);
+    if (src.readable) rec.signature = src.signature;
+    // The build is taken to be a second after the source was last written: the source
+    // window counts a source whose time is at or after the build's as changed since.
+    std::uint32_t build = src.exists ? src.mtime + 1 : importTime;
     d->records.push_back(makeImportedRecord(rec, build, importTime));
   }
   d->header.recordCount = static_cast<std::uint32_t>(d->records.size());

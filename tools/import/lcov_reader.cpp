@@ -99,7 +99,7 @@ struct Parser {
 
     if (key == "SF") {
       if (value.empty()) return fail("SF without a file name");
-      current = &data.file(std::string(value));
+      current = &data.file(normalisedSourcePath(std::string(value), data.baseDirectory));
       ranges.clear();
       return true;
     }
@@ -168,8 +168,24 @@ struct Parser {
       f.calls = addCounts(f.calls, calls);
       return true;
     }
-    // Test names, summaries, version and branch records (and the records newer tools
-    // add) carry nothing we keep; anything that is not a record name is bad input.
+    if (key == "BRDA") {
+      if (!needRecord(key)) return false;
+      // BRDA:line,block,branch,taken; lcov 2 may write an expression as the branch, so the
+      // branch is all between the block and the last field. "-": the block never ran.
+      size_t c1 = value.find(','), c2 = c1 == std::string_view::npos ? c1 : value.find(',', c1 + 1);
+      size_t c3 = value.rfind(',');
+      std::uint32_t ln;
+      std::uint64_t taken = 0;
+      if (c2 == std::string_view::npos || c3 <= c2 || !lineNumber(value.substr(0, c1), ln) || ln == 0 ||
+          (value.substr(c3 + 1) != "-" && !count(value.substr(c3 + 1), taken)))
+        return fail("malformed BRDA record '" + std::string(value) + "'");
+      current->addBranch(ln, BranchKey{std::string(value.substr(c1 + 1, c2 - c1 - 1)),
+                                       std::string(value.substr(c2 + 1, c3 - c2 - 1))},
+                         taken);
+      return true;
+    }
+    // Test names, summaries, version and other records (and the records newer tools add)
+    // carry nothing we keep; anything that is not a record name is bad input.
     bool recordName = !key.empty();
     for (char c : key) recordName = recordName && ((c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') || c == '_');
     if (recordName) return true;
@@ -183,18 +199,28 @@ bool readLcovTracefile(const std::string& name, const std::string& text, Importe
                        ImportError& error) {
   Parser p{name, data, error, 0, nullptr, {}};
   size_t pos = 0;
-  while (pos < text.size()) {
+  bool ok = true;
+  while (ok && pos < text.size()) {
     size_t nl = text.find('\n', pos);
     size_t end = nl == std::string::npos ? text.size() : nl;
     ++p.lineNo;
     std::string_view line(text.data() + pos, end - pos);
-    if (line.find('\0') != std::string_view::npos) return p.fail("binary data in a tracefile");
-    if (!p.line(line)) return false;
+    if (line.find('\0') != std::string_view::npos) {
+      ok = p.fail("binary data in a tracefile");
+    } else if (!p.line(line)) {
+      // A last line without its newline that does not read is most likely cut short.
+      if (nl == std::string::npos)
+        error.message = "the tracefile looks truncated: its last line '" +
+                        std::string(line.substr(0, 80)) + "' is incomplete (" + error.message + ")";
+      ok = false;
+    }
     pos = end + 1;
   }
-  if (p.current) {
+  if (ok && p.current) {
     ++p.lineNo;
-    return p.fail("the last record has no end_of_record (the file may be truncated)");
+    ok = p.fail("the tracefile looks truncated: its last record has no end_of_record");
   }
-  return true;
+  // What was read before a failure stays named as well.
+  data.nameFunctions();
+  return ok;
 }

@@ -1,4 +1,4 @@
-// Assigning instrumented lines to functions and hashing the record's structure.
+// Assigning instrumented lines to functions and hashing the record's line set.
 #include "tools/import/record_layout.h"
 
 #include <algorithm>
@@ -10,7 +10,7 @@ namespace {
 
 struct Range {
   std::uint32_t start, end;  // end inclusive
-  size_t function;           // index into the laid-out functions
+  size_t function;           // index into the laid-out functions: the group's owner
 };
 
 std::uint32_t fnv1a(std::uint32_t h, const void* data, size_t n) {
@@ -26,32 +26,44 @@ LaidOutRecord layOutRecord(const ImportedFile& file) {
   rec.path = file.path;
   rec.sessions = saturatedCount(file.runs == 0 ? 1 : file.runs);
 
+  // By key, not by shown name: both routes give the same keys, so the same order and the
+  // same owner of a shared line.
   std::vector<const ImportedFunction*> funcs;
   for (const auto& f : file.functions) funcs.push_back(&f);
   std::stable_sort(funcs.begin(), funcs.end(), [](const ImportedFunction* a, const ImportedFunction* b) {
     if (a->startLine != b->startLine) return a->startLine < b->startLine;
-    return a->name < b->name;
+    return a->key < b->key;
   });
   for (const ImportedFunction* f : funcs)
     rec.functions.push_back({f->name, f->startLine, saturatedCount(f->calls), {}});
 
-  // Ranges: a known end is used as it is; an unknown one reaches to the line before the next
-  // function that starts later (or to the end of the file).
+  // One range per group of functions starting on one line. Known ends are used as they
+  // are; otherwise the group reaches to the line before the next function that starts
+  // later (or to the end of the file).
   std::vector<Range> ranges;
-  for (size_t i = 0; i < funcs.size(); ++i) {
-    const ImportedFunction* f = funcs[i];
-    if (f->startLine == 0) continue;
-    std::uint32_t end = f->endLine;
-    if (end == 0 || end < f->startLine) {
-      end = std::numeric_limits<std::uint32_t>::max();
-      for (size_t j = i + 1; j < funcs.size(); ++j) {
-        if (funcs[j]->startLine > f->startLine) {
-          end = funcs[j]->startLine - 1;
-          break;
-        }
+  for (size_t i = 0; i < funcs.size();) {
+    std::uint32_t start = funcs[i]->startLine;
+    size_t j = i;
+    while (j < funcs.size() && funcs[j]->startLine == start) ++j;
+    if (start == 0) {
+      i = j;
+      continue;
+    }
+    std::uint32_t end = 0;
+    bool ends = true;
+    size_t owner = i;
+    bool called = false;
+    for (size_t k = i; k < j; ++k) {
+      if (funcs[k]->endLine < start) ends = false;
+      end = std::max(end, funcs[k]->endLine);
+      if (!called && funcs[k]->calls != 0) {
+        owner = k;
+        called = true;
       }
     }
-    ranges.push_back({f->startLine, end, i});
+    if (!ends) end = j < funcs.size() ? funcs[j]->startLine - 1 : std::numeric_limits<std::uint32_t>::max();
+    ranges.push_back({start, end, owner});
+    i = j;
   }
 
   // Sweep the lines in order with the ranges that have started; the innermost holding
@@ -71,9 +83,16 @@ LaidOutRecord layOutRecord(const ImportedFile& file) {
         best = *it;
       ++it;
     }
-    LaidOutLine l{line, saturatedCount(hits)};
-    if (best) rec.functions[best->function].lines.push_back(l);
-    else fileScope.push_back(l);
+    LaidOutLine l{line, saturatedCount(hits), {}};
+    auto b = file.branches.find(line);
+    if (b != file.branches.end()) {
+      // A branch taken more often than its line ran (possible only in odd or merged data)
+      // would raise the line's count; nor can a line that never ran have taken a branch.
+      for (const auto& [key, taken] : b->second)
+        l.branches.push_back(std::min(saturatedCount(taken), l.hits));
+    }
+    if (best) rec.functions[best->function].lines.push_back(std::move(l));
+    else fileScope.push_back(std::move(l));
   }
   if (!fileScope.empty()) {
     // Not a real function: it counts as called when any of its lines ran.
@@ -84,13 +103,11 @@ LaidOutRecord layOutRecord(const ImportedFile& file) {
         {kFileScopeName, first, static_cast<std::uint16_t>(ran ? 1 : 0), std::move(fileScope)});
   }
 
+  // Stands in for the source's content when that cannot be read: two captures of a file
+  // then merge as one version only when they hold the same lines.
   std::uint32_t h = 2166136261u;
-  h = fnv1a(h, rec.path.data(), rec.path.size() + 0);
-  for (const auto& f : rec.functions) {
-    h = fnv1a(h, f.name.c_str(), f.name.size() + 1);
-    h = fnv1a(h, &f.firstLine, sizeof f.firstLine);
-    for (const auto& l : f.lines) h = fnv1a(h, &l.line, sizeof l.line);
-  }
+  h = fnv1a(h, rec.path.data(), rec.path.size() + 1);
+  for (const auto& [line, hits] : file.lines) h = fnv1a(h, &line, sizeof line);
   rec.signature = h == 0 ? 1 : h;
   return rec;
 }

@@ -1,5 +1,6 @@
 // How an imported source file becomes one data record: its functions in order, each with
-// its first line, call count and the instrumented lines that belong to it.
+// its first line, call count and the instrumented lines that belong to it, each line with
+// the taken counts of its branch outcomes.
 #pragma once
 
 #include <cstdint>
@@ -17,6 +18,9 @@ inline std::uint16_t saturatedCount(std::uint64_t v) {
 struct LaidOutLine {
   std::uint32_t line;
   std::uint16_t hits;
+  // One per branch outcome, never above the line's hits: the outcomes follow the line's
+  // own block, and the line's count is the largest of its blocks.
+  std::vector<std::uint16_t> branches;
 };
 
 struct LaidOutFunction {
@@ -30,13 +34,17 @@ struct LaidOutRecord {
   std::string path;
   std::uint16_t sessions;
   std::vector<LaidOutFunction> functions;
-  std::uint32_t signature;  // non-zero hash of names and lines
+  std::uint32_t signature;  // non-zero hash of the path and the line set
 };
 
 // The name of the function that holds the lines outside every function.
 extern const char* const kFileScopeName;
 
-// Functions ordered by first line (then name); each line goes to the innermost function
-// whose range holds it (a function without a known end reaches to the next function's
-// start); lines in no function go to a last function named "(file scope)".
+// Functions ordered by first line (then key). Functions that start on one line form a group
+// that the data cannot split (macro-generated functions, a destructor's variants): the
+// group's lines all go to one of them, the first called one in key order (else the first),
+// and the others keep only their first line and calls. Each line goes to the innermost
+// group whose range holds it (a group whose ends are not all known reaches to the next
+// function's start); lines in no function go to a last function named "(file scope)".
+// Branch outcomes at lines without a line count are left out: they would add a line.
 LaidOutRecord layOutRecord(const ImportedFile& file);
