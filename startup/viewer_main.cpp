@@ -12,6 +12,7 @@
 #include "support/diagnostic.h"
 #include "support/errors.h"
 #include "updates/kg_file_monitor.h"
+#include "updates/kg_scripts.h"
 
 namespace {
 
@@ -61,6 +62,8 @@ ErrorCode showMainWindow(StartupState& s, StartupSummary& prepared) {
   input.sourceWindows = &sourceWindows;
   KG_FileMonitor monitor;
   input.dataWatcher = &monitor;
+  KG_Scripts scripts;
+  input.scripts = &scripts;
   std::string failure;
   ErrorCode rc = runMainWindow(input, failure);
   if (rc != allOK && !failure.empty()) reportError(rc, "%s", failure.c_str());

@@ -87,7 +87,8 @@ ErrorCode runMainWindow(MainWindowInput& input, std::string& failure) {
       if (input.dataWatcher) input.dataWatcher->start(frame);
       app->run();
       if (input.dataWatcher) input.dataWatcher->stop();
-      // The source windows go before the main window and the display they live on.
+      // The other windows go before the main window and the display they live on.
+      if (input.scripts) input.scripts->closeAll();
       if (input.sourceWindows) input.sourceWindows->closeAll();
       setLockWaitCallback(previous);
     }

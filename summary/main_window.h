@@ -13,6 +13,7 @@
 #include "coverage/kgv_merge.h"
 #include "coverage/summary_types.h"
 #include "summary/data_watcher.h"
+#include "summary/script_runner.h"
 #include "summary/source_windows.h"
 #include "support/errors.h"
 
@@ -30,6 +31,7 @@ struct MainWindowInput {
   std::vector<std::string> adjustmentProblems;
   KG_SourceWindows* sourceWindows = nullptr;  // the annotated source windows; not owned
   KG_DataWatcher* dataWatcher = nullptr;      // the watch over the data files; not owned
+  KG_ScriptRunner* scripts = nullptr;         // the scripts menu and output windows; not owned
 };
 
 // The toolkit opens the display (unless start-up opened it already) with the settings'

@@ -170,6 +170,11 @@ ErrorCode KG_SumFrame::build(std::string& error) {
     input_.sourceWindows->exitViewer = [this] { exit_viewer(); };
     input_.sourceWindows->versionText = input_.versionText;
   }
+  // A missing or empty scripts directory means a broken installation: the window is not made.
+  if (input_.scripts) {
+    ErrorCode rc = input_.scripts->build(*this, error);
+    if (rc != allOK) return rc;
+  }
   return allOK;
 }
 
@@ -180,6 +185,7 @@ void KG_SumFrame::buildMenus() {
   buildActions(bar->addPulldown("kgActions", "Actions", "kgExpandCollapseMenu"));
   OI_Menu* adj = bar->addPulldown("kgAdjustmentsPulldown", "Adjustments", "kgAdjustments");
   adj->addCell("kgCompileAdjustments", "Extract adjustments from all source files", [this] { extract_adjustments(); });
+  buildDebugMenu(bar->addPulldown("kgDebugPulldown", "Debug", "kgDebug"));
 }
 
 void KG_SumFrame::buildFileMenu(OI_Menu* file) {
@@ -188,6 +194,9 @@ void KG_SumFrame::buildFileMenu(OI_Menu* file) {
   file->addCell("kgWriteKgv", "Write .kgv file...", [this] { writeKgvTo(); });
   file->addCell("kgWriteExport", "Write export file...", [this] { writeExportTo(); });
   file->addCell("kgWriteOutline", "Save as...", [this] { askAndSaveOutline(); });
+  file->addCell("kgRunScript", "Run script...", [this] {
+    if (input_.scripts) input_.scripts->run();
+  });
   OI_MenuCell* crms = file->addCell("kgStartCRMS", "File a Change Request", [this] { startChangeRequest(); });
   crms->setSensitive(!kgSettings().crmsCommandString.value.empty());
   file->addSeparator();
@@ -445,6 +454,7 @@ void KG_SumFrame::exit_viewer() {
   // An annotated source window with unsaved edits asks first, and may keep the viewer open.
   if (input_.sourceWindows && kgSettings().saveSourceAtExit.value && !input_.sourceWindows->confirmExit()) return;
   if (input_.sourceWindows) input_.sourceWindows->closeAll();
+  if (input_.scripts) input_.scripts->closeAll();
   const std::string note = createUserDefaultsFromTemplate(input_.installDir);
   if (!note.empty()) show_message(OI_Severity::information, note);
   OI_Application::instance()->quit();

@@ -53,6 +53,7 @@ class KG_SumFrame {
   void set_sort_order(std::uint32_t order);
   void set_stripes(int setting);
   void set_toolbar_visible(bool on);
+  const std::string& install_dir() const;
   // The data files shown, with the times they were loaded.
   std::vector<KgvFileRef>& loaded_files();
   // The File menu's data operations.
@@ -77,6 +78,7 @@ class KG_SumFrame {
   void buildViewMenu(OI_Menu* view);
   void buildActions(OI_Menu* actions);
   void buildHelpMenu();
+  void buildDebugMenu(OI_Menu* debug);
   void buildPopup();
   void perform(const std::string& actionString);
   void placeHeadings();

@@ -61,6 +61,8 @@ class WindowQuestion : public ExtractionQuestion {
 
 std::vector<KgvFileRef>& KG_SumFrame::loaded_files() { return input_.loadedFiles; }
 
+const std::string& KG_SumFrame::install_dir() const { return input_.installDir; }
+
 void KG_SumFrame::reload_all() {
   KG_SummaryOverall* all = overall();
   if (all == nullptr || input_.loadedFiles.empty()) return;

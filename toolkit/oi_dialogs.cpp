@@ -159,6 +159,8 @@ void OI_MessageDialog::describe(std::ostream& out) const {
 
 // ------------------------------------------------------------------ custom dialog
 
+struct OI_CustomDialog::Wait : ::Wait {};
+
 OI_CustomDialog::OI_CustomDialog(Widget parent, const std::string& name, const std::string& title) {
   Widget d = makeTemplate(parentOrShell(parent), name, title, OI_Severity::plain);
   adopt(d, name);
@@ -181,15 +183,23 @@ std::string OI_CustomDialog::run() {
   Widget d = widget();
   if (!d) return {};
   Wait wait;
+  running_ = &wait;
   std::vector<std::unique_ptr<ButtonTag>> tags;
   for (Widget b : buttons_) {
     tags.push_back(std::make_unique<ButtonTag>(ButtonTag{&wait, XtName(b)}));
     XtAddCallback(b, XmNactivateCallback, buttonCB, tags.back().get());
   }
   waitFor(d, wait);
+  running_ = nullptr;
   for (size_t i = 0; i < buttons_.size(); ++i) XtRemoveCallback(buttons_[i], XmNactivateCallback, buttonCB, tags[i].get());
   oiRestoreFocus(XtParent(d));
   return wait.answer;
+}
+
+void OI_CustomDialog::finish(const std::string& answer) {
+  if (!running_) return;
+  running_->answer = answer;
+  running_->done = true;
 }
 
 // ------------------------------------------------------------------ questions

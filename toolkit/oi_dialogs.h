@@ -36,10 +36,14 @@ class OI_CustomDialog : public OI_Widget {
   // Shows the dialog over its parent until a button is pressed: its name, or "" when the
   // window was closed.
   std::string run();
+  // Ends a run as if the button of that name had been pressed (Return in a field, say).
+  void finish(const std::string& answer);
 
  private:
+  struct Wait;
   Widget work_ = nullptr;
   std::vector<Widget> buttons_;
+  Wait* running_ = nullptr;
 };
 
 // A question with the given buttons; returns the pressed button's name, "" when the window was

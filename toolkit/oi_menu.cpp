@@ -218,6 +218,12 @@ void OI_OptionMenu::setChoice(const std::string& name) {
     if (n == name && widget()) XtVaSetValues(widget(), XmNmenuHistory, b, nullptr);
 }
 
+void OI_OptionMenu::setColumnLength(int length) {
+  if (!pane_ || length <= 0 || choices_.size() <= static_cast<size_t>(length)) return;
+  const short columns = static_cast<short>((choices_.size() + static_cast<size_t>(length) - 1) / static_cast<size_t>(length));
+  XtVaSetValues(pane_, XmNpacking, XmPACK_COLUMN, XmNorientation, XmVERTICAL, XmNnumColumns, columns, nullptr);
+}
+
 std::string OI_OptionMenu::choice() const {
   if (!widget()) return {};
   Widget b = nullptr;

@@ -84,6 +84,8 @@ class OI_OptionMenu : public OI_Widget {
   void addChoice(const std::string& name, const std::string& label);
   void setChoice(const std::string& name);  // does not call the callback
   std::string choice() const;
+  // Long lists of choices in columns of that many.
+  void setColumnLength(int length);
   std::function<void(const std::string&)> onChange;
   void describe(std::ostream& out) const override;
 
