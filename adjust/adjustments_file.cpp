@@ -261,10 +261,10 @@ bool parseAdjustments(std::string_view text, const std::string& path, Adjustment
     text = unixText;
   }
   // Text that begins with the banner is a file this program wrote; its paths may hold any
-  // bytes but NUL (a Latin-1 folder name is not UTF-8), so only NULs and control bytes make
-  // it binary.
+  // bytes but NUL (a Latin-1 folder name is not UTF-8, and Linux allows control bytes), so
+  // only a NUL makes it binary.
   std::string_view head = text.substr(0, 512);
-  bool ours = head.substr(0, kBanner.size()) == kBanner && isTextInAnyEncoding(head);
+  bool ours = head.substr(0, kBanner.size()) == kBanner && head.find('\0') == std::string_view::npos;
   if (!ours && !isPlainTextOrUtf8Bytes(head, text.size() > 512)) {
     warnings.push_back(notTextWarning(path));
     return false;

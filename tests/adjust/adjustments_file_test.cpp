@@ -253,27 +253,29 @@ TEST_F(AdjustmentsFile, PathsThatAreNotUtf8ReadBackToo) {
   ASSERT_EQ(adjustmentList().size(), 1u);
   EXPECT_EQ(adjustmentList().entries()[0].resolvedName(), a);
 
-  // The input the reader's fuzz target found: its names hold bytes 0xff.
-  std::string found = readFile(kgtest::sourceDir() +
-                               "/fuzz/regressions/adjustments_reader_fuzz/"
-                               "crash-fed75bc2b1528d7ba2f3881ff71f89fbb6d6975c-minimized");
-  AdjustmentList list;
-  std::vector<std::string> warnings;
-  parseAdjustments(kBanner + found, "found", list, warnings);
-  ASSERT_FALSE(list.empty());
-  ASSERT_NE(list.entries()[0].resolvedName().find('\xff'), std::string::npos);
-  char* buf = nullptr;
-  size_t len = 0;
-  FILE* out = open_memstream(&buf, &len);
-  ASSERT_TRUE(writeAdjustments(out, "test", list));
-  fclose(out);
-  std::string written(buf, len);
-  free(buf);
-  AdjustmentList again;
-  warnings.clear();
-  EXPECT_TRUE(parseAdjustments(written, "written", again, warnings));
-  EXPECT_EQ(warnings, std::vector<std::string>{});
-  EXPECT_EQ(again.size(), list.size());
+  // The inputs the reader's fuzz target found: names holding bytes 0xff, and control bytes.
+  for (const char* found : {"crash-fed75bc2b1528d7ba2f3881ff71f89fbb6d6975c-minimized",
+                            "crash-6552bfb474d9ddca153f538ee1aa1e1e79551255-minimized",
+                            "control-bytes-in-path.adjust"}) {
+    std::string text = readFile(kgtest::sourceDir() + "/fuzz/regressions/adjustments_reader_fuzz/" + found);
+    if (text.rfind(kBanner, 0) != 0) text = kBanner + text;
+    AdjustmentList list;
+    std::vector<std::string> warnings;
+    parseAdjustments(text, "found", list, warnings);
+    ASSERT_FALSE(list.empty()) << found;
+    char* buf = nullptr;
+    size_t len = 0;
+    FILE* out = open_memstream(&buf, &len);
+    ASSERT_TRUE(writeAdjustments(out, "test", list));
+    fclose(out);
+    std::string written(buf, len);
+    free(buf);
+    AdjustmentList again;
+    warnings.clear();
+    EXPECT_TRUE(parseAdjustments(written, "written", again, warnings)) << found;
+    EXPECT_EQ(warnings, std::vector<std::string>{}) << found;
+    EXPECT_EQ(again.size(), list.size()) << found;
+  }
 }
 
 TEST_F(AdjustmentsFile, CarriageReturnLineEndsAreRead) {
