@@ -271,15 +271,6 @@ void KG_SumFrame::buildPopup() {
       popup_);
 }
 
-void KG_SumFrame::buildHelpMenu() {
-  OI_MenuBar* bar = window_->menuBar("kgTopMenu");
-  OI_Menu* help = bar->addPulldown("kgHelpPulldown", "Help", "kgHelp");
-  help->addCell("kgProductInfo", "Product information", [this] { showVersion(); });
-  bar->setHelpPulldown(help);
-}
-
-void KG_SumFrame::showVersion() { show_message(OI_Severity::information, input_.versionText); }
-
 void KG_SumFrame::perform(const std::string& actionString) {
   if (root_ == nullptr) return;
   if (actionString == "kgStartCRMS") {
