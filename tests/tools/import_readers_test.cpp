@@ -303,7 +303,7 @@ TEST(Branches, TracefileAndJsonOutcomesAddUpByLineAndPlace) {
                         {3, 5}, {3, 4}, {3, 2}, {3, 1}, {3, 0}, {3, 5}, {5, 0}, {5, 0}, {5, 0}, {5, 0}}));
 }
 
-TEST(Layout, FunctionsSharingTheirFirstLineGiveItsLinesToOneCalledFunction) {
+TEST(Layout, FunctionsSharingTheirFirstLineGiveItsLinesToTheLastOfThem) {
   // Six functions a macro writes on two lines, then one of their own.
   auto make = [](bool withEnds) {
     ImportedFile f;
@@ -321,13 +321,24 @@ TEST(Layout, FunctionsSharingTheirFirstLineGiveItsLinesToOneCalledFunction) {
     return f;
   };
   LaidOutRecord r = layOutRecord(make(true));
-  EXPECT_EQ(lines(fn(r, "alpha_get")), (std::vector<std::uint32_t>{6}));  // first called in key order
+  // The last by name holds the line, called or not; the others keep their line and calls.
+  EXPECT_EQ(lines(fn(r, "alpha_set")), (std::vector<std::uint32_t>{6}));
   EXPECT_EQ(lines(fn(r, "alpha_clear")), (std::vector<std::uint32_t>{}));
-  EXPECT_EQ(lines(fn(r, "alpha_set")), (std::vector<std::uint32_t>{}));
-  EXPECT_EQ(fn(r, "alpha_set").firstLine, 6u);
-  EXPECT_EQ(fn(r, "alpha_set").calls, 1u);
-  EXPECT_EQ(lines(fn(r, "beta_clear")), (std::vector<std::uint32_t>{7}));
+  EXPECT_EQ(lines(fn(r, "alpha_get")), (std::vector<std::uint32_t>{}));
+  EXPECT_EQ(fn(r, "alpha_get").firstLine, 6u);
+  EXPECT_EQ(fn(r, "alpha_get").calls, 2u);
+  EXPECT_EQ(lines(fn(r, "beta_set")), (std::vector<std::uint32_t>{7}));
+  EXPECT_EQ(lines(fn(r, "beta_clear")), (std::vector<std::uint32_t>{}));
   EXPECT_EQ(lines(fn(r, "main")), (std::vector<std::uint32_t>{9, 10}));
+  // Another capture that called other functions of the group lays out the same.
+  ImportedFile other = make(true);
+  other.function("alpha_get").calls = 0;
+  other.function("alpha_clear").calls = 5;
+  LaidOutRecord o = layOutRecord(other);
+  for (size_t i = 0; i < r.functions.size(); ++i) {
+    EXPECT_EQ(o.functions[i].name, r.functions[i].name);
+    EXPECT_EQ(lines(o.functions[i]), lines(r.functions[i]));
+  }
   // Without known ends (lcov 1.x tracefiles) the same.
   LaidOutRecord u = layOutRecord(make(false));
   ASSERT_EQ(u.functions.size(), r.functions.size());

@@ -26,13 +26,12 @@ LaidOutRecord layOutRecord(const ImportedFile& file) {
   rec.path = file.path;
   rec.sessions = saturatedCount(file.runs == 0 ? 1 : file.runs);
 
-  // By key, not by shown name: both routes give the same keys, so the same order and the
-  // same owner of a shared line.
+  // Functions of one line in the order of their names, as the merge orders them.
   std::vector<const ImportedFunction*> funcs;
   for (const auto& f : file.functions) funcs.push_back(&f);
   std::stable_sort(funcs.begin(), funcs.end(), [](const ImportedFunction* a, const ImportedFunction* b) {
     if (a->startLine != b->startLine) return a->startLine < b->startLine;
-    return a->key < b->key;
+    return a->name < b->name;
   });
   for (const ImportedFunction* f : funcs)
     rec.functions.push_back({f->name, f->startLine, saturatedCount(f->calls), {}});
@@ -51,16 +50,14 @@ LaidOutRecord layOutRecord(const ImportedFile& file) {
     }
     std::uint32_t end = 0;
     bool ends = true;
-    size_t owner = i;
-    bool called = false;
     for (size_t k = i; k < j; ++k) {
       if (funcs[k]->endLine < start) ends = false;
       end = std::max(end, funcs[k]->endLine);
-      if (!called && funcs[k]->calls != 0) {
-        owner = k;
-        called = true;
-      }
     }
+    // The last of the group holds its lines, whatever was called: data files merged later
+    // keep a line's blocks after the functions of its line, so the same function holds
+    // them after any merge of captures that called other functions of the group.
+    size_t owner = j - 1;
     if (!ends) end = j < funcs.size() ? funcs[j]->startLine - 1 : std::numeric_limits<std::uint32_t>::max();
     ranges.push_back({start, end, owner});
     i = j;

@@ -40,10 +40,10 @@ struct LaidOutRecord {
 // The name of the function that holds the lines outside every function.
 extern const char* const kFileScopeName;
 
-// Functions ordered by first line (then key). Functions that start on one line form a group
+// Functions ordered by first line, then name. Functions that start on one line form a group
 // that the data cannot split (macro-generated functions, a destructor's variants): the
-// group's lines all go to one of them, the first called one in key order (else the first),
-// and the others keep only their first line and calls. Each line goes to the innermost
+// group's lines all go to its last function (a destructor's base variant, D2), and the
+// others keep only their first line and calls. Each line goes to the innermost
 // group whose range holds it (a group whose ends are not all known reaches to the next
 // function's start); lines in no function go to a last function named "(file scope)".
 // Branch outcomes at lines without a line count are left out: they would add a line.
