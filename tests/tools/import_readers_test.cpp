@@ -365,3 +365,47 @@ TEST(Inputs, ImportsAddedTogetherEqualOneImportOfAllInputs) {
   EXPECT_EQ(k1->records[0]->counts, k2->records[0]->counts);
   EXPECT_EQ(k1->records[0]->strings, k2->records[0]->strings);
 }
+
+TEST(Exclusions, MarkedLinesBranchesAndFunctionsOfGcovDataAreLeftOutAsLcovDoes) {
+  kgtest::TempDir dir;
+  std::string src = dir.file("x.cc");
+  kgtest::writeFile(src,
+                    "int a() {\n"                              // 1
+                    "  return 1;  // LCOV_EXCL_LINE\n"         // 2
+                    "}\n"                                      // 3
+                    "// LCOV_EXCL_START\n"                     // 4
+                    "int b() { return 2; }\n"                  // 5
+                    "// LCOV_EXCL_STOP\n"                      // 6
+                    "int c(int x) { return x ? 1 : 0; }  // LCOV_EXCL_BR_LINE\n"  // 7
+                    "int d(int x) { return x ? 1 : 0; }  // LCOV_EXCL_EXCEPTION_BR_LINE\n"  // 8
+                    "int e(int x) { return x ? 1 : 0; }\n"     // 9
+                    "// LCOV_EXCL_BR_START\n");               // 10, left open
+  std::string doc = R"j({"files":[{"file":")j" + src + R"j(","functions":[)j"
+      R"j({"name":"a","start_line":1,"end_line":3},{"name":"b","start_line":5,"end_line":5},)j"
+      R"j({"name":"_ZN1SD0Ev","start_line":5,"end_line":5},{"name":"_ZN1SD2Ev","start_line":9,"end_line":9}],"lines":[)j";
+  for (int l = 1; l <= 9; ++l)
+    doc += std::string(l > 1 ? "," : "") + R"j({"line_number":)j" + std::to_string(l) +
+           R"j(,"count":1,"branches":[{"count":1},{"count":0}]})j";
+  doc += "]}]}";
+  ImportedData d;
+  ImportError e;
+  ASSERT_TRUE(readGcovJson("x.json", doc, d, e)) << e.text();
+  // The same data from a tracefile are lcov's already: nothing more is left out.
+  ImportedData t = lcov("SF:" + src + "\nDA:2,1\nBRDA:7,0,0,1\nend_of_record\n");
+  std::vector<std::string> warnings;
+  applyExclusionMarkers(d, warnings);
+  applyExclusionMarkers(t, warnings);
+  EXPECT_EQ(warnings, (std::vector<std::string>{src + ": an LCOV_EXCL section is not closed; it reaches to the end of the file"}));
+  const ImportedFile& f = d.files[0];
+  std::vector<std::uint32_t> kept, branched;
+  for (const auto& [l, hits] : f.lines) kept.push_back(l);
+  for (const auto& [l, b] : f.branches) branched.push_back(l);
+  EXPECT_EQ(kept, (std::vector<std::uint32_t>{1, 3, 6, 7, 8, 9}));
+  EXPECT_EQ(branched, (std::vector<std::uint32_t>{1, 3, 6, 9}));
+  std::vector<std::string> names;
+  for (const auto& fn : f.functions) names.push_back(fn.name);
+  // A variant alone again needs no mark.
+  EXPECT_EQ(names, (std::vector<std::string>{"a", "S::~S()"}));
+  EXPECT_EQ(t.files[0].lines.size(), 1u);
+  EXPECT_EQ(t.files[0].branches.size(), 1u);
+}

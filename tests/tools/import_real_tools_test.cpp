@@ -80,6 +80,28 @@ const char kShapes[] =
     "  return 0;\n"
     "}\n";
 
+// lcov's exclusion markers, each kind: lcov leaves out what they mark when it captures,
+// and so must every other route.
+const char kMarked[] =
+    "#include <cstdio>\n"
+    "#include <stdexcept>\n"
+    "int checked(int x) {\n"
+    "  if (x > 100) throw std::out_of_range(\"x\");  // LCOV_EXCL_EXCEPTION_BR_LINE\n"
+    "  if (x < 0) return -x;  // LCOV_EXCL_LINE\n"
+    "  return x > 5 && x < 9 ? 1 : 2;  // LCOV_EXCL_BR_LINE\n"
+    "}\n"
+    "// LCOV_EXCL_START\n"
+    "int debugOnly(int x) {\n"
+    "  return x ? x * 3 : 1;\n"
+    "}\n"
+    "// LCOV_EXCL_STOP\n"
+    "int main(int argc, char**) {\n"
+    "  int s = checked(argc) + checked(7);\n"
+    "  try { s += checked(argc + 200); } catch (const std::exception&) { s++; }\n"
+    "  std::printf(\"%d\\n\", s);\n"
+    "  return argc > 3 ? debugOnly(s) : 0;\n"
+    "}\n";
+
 // Functions a macro writes on one line each time it is used, as libuv's loop watchers and
 // RB_GENERATE do.
 const char kMacroFunctions[] =
@@ -331,11 +353,12 @@ std::vector<RecordView> records(const std::string& kgv) {
 
 }  // namespace
 
-// Every route to a data file gives lcov's figures per file, branches included; and the one
-// command on the build directory gives exactly what the tracefile gives.
+// Every route to a data file gives lcov's figures per file, branches included, lcov's
+// exclusion markers heeded; and the one command on the build directory gives exactly what
+// the tracefile gives.
 TEST(ImportFromRealTools, EveryRouteAgreesWithLcovOnLinesFunctionsAndBranches) {
   for (const auto& [name, source] : {std::pair<std::string, std::string>{"branchy.c", kBranchy},
-                                     {"shapes.cc", kShapes}}) {
+                                     {"shapes.cc", kShapes}, {"marked.cc", kMarked}}) {
     SCOPED_TRACE(name);
     Built b;
     buildAndRun(b, name, source, 2, "some words");

@@ -152,6 +152,7 @@ void addImportedData(ImportedData& into, const ImportedData& from) {
     for (const auto& [line, outcomes] : src.branches)
       for (const auto& [key, taken] : outcomes) dst.addBranch(line, key, taken);
     dst.runs = addCounts(dst.runs, src.runs);
+    dst.fromGcov = dst.fromGcov || src.fromGcov;
   }
   into.nameFunctions();
 }

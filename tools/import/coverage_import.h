@@ -39,6 +39,9 @@ struct ImportedFile {
   std::map<std::uint32_t, LineBranches> branches;         // line -> outcome -> times taken
   std::uint64_t runs = 0;                                 // 0 when the input does not say
   bool namesDue = false;                                  // functions added since naming
+  // Read from gcov, whose data lcov filters by the exclusion markers in the source; lcov's
+  // tracefiles come filtered.
+  bool fromGcov = false;
 
   // The function of that key, added when new.
   ImportedFunction& function(const std::string& key);
@@ -61,6 +64,14 @@ struct ImportedData {
 
 // Adds everything `from` holds to `into`, as reading its inputs after `into`'s would have.
 void addImportedData(ImportedData& into, const ImportedData& from);
+
+// Leaves out of the files read from gcov what lcov 1.16 (Debian 12) leaves out by the
+// markers in their sources: lines marked LCOV_EXCL_LINE or between LCOV_EXCL_START and
+// LCOV_EXCL_STOP (with their branches, and the functions that start there), and all
+// branches of lines marked LCOV_EXCL_BR_LINE or LCOV_EXCL_EXCEPTION_BR_LINE or between the
+// _START and _STOP of either. Sources that cannot be read are left as they are. A section
+// left open is reported in `warnings`.
+void applyExclusionMarkers(ImportedData& data, std::vector<std::string>& warnings);
 
 // The name shown for a function: C++ names demangled, others as they are.
 std::string demangledName(const std::string& key);

@@ -110,6 +110,7 @@ struct Reader {
       std::string full = normalisedSourcePath(path->get<std::string>(), cwd.empty() ? data.baseDirectory : cwd);
       if (full.find('\0') != std::string::npos) return fail(start, "a file name holds a NUL character");
       ImportedFile& file = data.file(full);
+      file.fromGcov = true;
 
       auto funcs = f.find("functions");
       if (funcs != f.end()) {

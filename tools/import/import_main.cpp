@@ -80,8 +80,9 @@ int main(int argc, char** argv) {
         to = a.substr(l.size() + 1);
         return true;
       }
-      if (shortName && a.size() > 2 && a.compare(0, 2, shortName) == 0 && a[2] == '=') {
-        to = a.substr(3);
+      // "-n=VALUE" and "-nVALUE" ("-j2", as make takes it).
+      if (shortName && a.size() > 2 && a.compare(0, 2, shortName) == 0) {
+        to = a.substr(a[2] == '=' ? 3 : 2);
         return true;
       }
       return false;
@@ -154,6 +155,8 @@ int main(int argc, char** argv) {
     }
     if (!ok) return fail(error.text());
   }
+  applyExclusionMarkers(data, warnings);
+  for (const auto& w : warnings) fprintf(stderr, "kestrel-import: %s\n", w.c_str());
   if (data.files.empty()) return fail("the inputs hold no coverage data");
 
   auto now = static_cast<std::uint32_t>(time(nullptr));
