@@ -583,6 +583,10 @@ TEST(ImportFromRealTools, CapturesOfOneProgramMergeInEitherOrderAsOneImport) {
     both.insert(both.end(), route.tests.begin(), route.tests.end());
     import(b, "combined.kgv", both);
     Report combined = exportOf(b, "combined.kgv");
+    // One gcov process at a time or several: the same data.
+    import(b, "serial.kgv", both, {"--jobs", "1"});
+    std::string serialWhy;
+    EXPECT_TRUE(sameReport(exportOf(b, "serial.kgv"), combined, true, serialWhy)) << serialWhy;
     EXPECT_EQ(kestrelFigures(combined), lcovFigures(kgtest::readFile(b.dir.file("all.info"))));
     for (const auto& order : {std::pair<std::string, std::string>{"lib.kgv", "tests.kgv"}, {"tests.kgv", "lib.kgv"}}) {
       SCOPED_TRACE(order.first + " then " + order.second);
@@ -703,6 +707,13 @@ TEST(ImportCommand, MessagesSayWhatIsWrongAndWhatToDo) {
   EXPECT_EQ(r.status, 2);
   EXPECT_EQ(r.err, "kestrel-import: cannot write " + b.dir.file("no/such/out.kgv") + ": the folder " +
                        b.dir.file("no/such") + " does not exist\n");
+
+  // A folder no file can be made in (even by root): no advice of an option this program lacks.
+  r = runProcess({importer, "-o", "/proc/out.kgv", b.dir.file("prog.info")});
+  EXPECT_EQ(r.status, 2);
+  EXPECT_EQ(r.err.rfind("kestrel-import: cannot write /proc/out.kgv: its lock directory could not be created; "
+                        "check that you may write in /proc\n", 0), 0u) << r.err;
+  EXPECT_EQ(r.err.find("-locking"), std::string::npos) << r.err;
 
   // Cut in the middle of a line, and at a line's end.
   size_t da = info.find("\nDA:") + 3;

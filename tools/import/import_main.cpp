@@ -14,6 +14,7 @@
 #include "coverage/kgv_file.h"
 #include "coverage/kgv_lock.h"
 #include "support/diagnostic.h"
+#include "support/errors.h"
 #include "tools/import/coverage_import.h"
 #include "tools/import/gcov_runner.h"
 #include "tools/import/import_records.h"
@@ -167,6 +168,14 @@ int main(int argc, char** argv) {
     rc = writeKgvFile(out, *kgv);
     ErrorCode unlocked = unlockKgvFile(out);
     if (rc == allOK) rc = unlocked;
+  }
+  if (rc == lockDirNotCreated || rc == lockDirNotRemove) {
+    // The viewer's text for these offers -locking=no, which is no option of this program.
+    std::string detail = pendingSystemError();
+    clearPendingSystemError();
+    return fail("cannot write " + out + ": its lock directory could not be " +
+                (rc == lockDirNotCreated ? "created" : "removed") + "; check that you may write in " + folder +
+                (detail.empty() ? "" : "\n" + detail));
   }
   if (rc != allOK) return fail("cannot write " + out + ":\n" + errorMessage(rc));
   return 0;
