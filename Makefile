@@ -15,7 +15,7 @@ PKGS := g++ cmake pkg-config ca-certificates \
         libx11-dev libxext-dev libxt-dev libmotif-dev libxft-dev libxmu-dev libfontconfig-dev \
         zlib1g-dev nlohmann-json3-dev \
         clang libclang-rt-14-dev \
-        xvfb xdotool x11-apps x11-utils imagemagick xfonts-base fonts-dejavu-core \
+        xvfb xdotool x11-apps x11-utils x11-xserver-utils imagemagick xfonts-base fonts-dejavu-core \
         lcov time
 
 .PHONY: all deps configure build demo test test-release test-asan fuzz bench lcov-check clean

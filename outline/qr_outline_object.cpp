@@ -418,6 +418,11 @@ void QR_OutlineObject::make_expandable() {
     flags_ |= kExpandable;
     attach_actions(t.collapse_all);
     put_annotation(QR_OutlineExpandGlyph, 0, 0);
+    // A collapsed row with children can expand further, and so can every open row above it:
+    // "Expand all" is offered on them, also in the glyph's menu of a row never selected.
+    attach_actions(t.expand_all);
+    for (QR_OutlineObject* p = parent_row(); p != nullptr && !p->is_root() && p->is_expanded(); p = p->parent_row())
+      p->attach_actions(t.expand_all);
   }
   attach_actions(t.select);
   saved_line_count_ = line_count_ > 1 ? line_count_ : 1;

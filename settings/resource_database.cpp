@@ -152,13 +152,12 @@ XrmDatabase buildResourceDatabase(const ResourceDatabaseInput& in,
     }
   }
 
-  // The display's own resources and the command line's -xrm lines.
+  // The display's own resources (xrdb), then the user's file over them, then the command
+  // line's -xrm lines over everything: the order X users know.
   mergeText(db, in.displayResources);
-  mergeText(db, joinLines(in.commandLineResources));
-
-  // The user's file wins over everything before it.
   std::string user = in.userDefaultsFile.empty() ? userDefaultsPath() : in.userDefaultsFile;
   if (readable(user)) XrmCombineFileDatabase(user.c_str(), &db, True);
+  mergeText(db, joinLines(in.commandLineResources));
 
   if (!db) db = XrmGetStringDatabase("");
   gDatabase = db;

@@ -12,8 +12,8 @@ struct ResourceDatabaseInput {
   std::string installDir;  // the installation directory; resource files live in its "UI"
   int language = 0;        // 0 English, 1 Japanese
   bool greyBackground = false;  // the display asks for the grey Motif background
-  // Resources of the display (the server's resource property), then -xrm lines; both are
-  // merged above the application defaults and below the per-user defaults file.
+  // Resources of the display (the server's resource property), merged above the application
+  // defaults and below the per-user defaults file; -xrm lines, merged over everything.
   std::string displayResources;
   std::vector<std::string> commandLineResources;
   // A per-user defaults file other than "~/.kestrel.Xdefaults" (tests); empty = the usual.

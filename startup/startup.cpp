@@ -149,8 +149,9 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, StartupSu
   s.language = kgChooseLanguage(languageArgument(argc, argv));
 
   // 6. The display, for the window only.
+  DisplayResources displayResources;
   if (s.mode == RunMode::view && displayCheck) {
-    ErrorCode rc = displayCheck(argc, argv);
+    ErrorCode rc = displayCheck(argc, argv, displayResources);
     if (rc != allOK) return rc;
   }
 
@@ -158,6 +159,8 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, StartupSu
   ResourceSettingsInput settingsInput;
   settingsInput.installDir = home;
   settingsInput.language = s.language;
+  settingsInput.displayResources = std::move(displayResources.display);
+  settingsInput.commandLineResources = std::move(displayResources.commandLine);
   for (const auto& w : loadResourceSettings(settingsInput)) kgWarning("%s", w.c_str());
   wireSettingsIntoEngine();
 

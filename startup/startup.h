@@ -64,8 +64,16 @@ ErrorCode applyHelpMaxWait(const std::vector<ViewerOption>& options);
 std::string versionBanner(const StartupState& s);
 extern const char* const kUsageText;
 
-// Checks that a display can be reached (the program supplies it); returns allOK or 8.
-using DisplayCheck = ErrorCode (*)(int& argc, char** argv);
+// What the display gives the resource settings: the server's resources (as xrdb loaded
+// them) and the resource lines of the toolkit's own command-line options (-xrm and the like).
+struct DisplayResources {
+  std::string display;
+  std::vector<std::string> commandLine;
+};
+
+// Opens the display (the program supplies it), taking the toolkit's options out of the
+// arguments; returns allOK or 8.
+using DisplayCheck = ErrorCode (*)(int& argc, char** argv, DisplayResources& resources);
 
 // Start-up steps, the load steps, then a console mode run to its end. For the window mode
 // it stops once the summary is built: `showWindow` is set and `prepared` holds what the

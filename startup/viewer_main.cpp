@@ -11,37 +11,32 @@
 #include "summary/main_window.h"
 #include "support/diagnostic.h"
 #include "support/errors.h"
+#include "toolkit/oi_application.h"
 #include "updates/kg_file_monitor.h"
 #include "updates/kg_scripts.h"
 
 namespace {
 
-// Until the toolkit takes over, the display is opened with Xlib to see that it can be.
-ErrorCode checkDisplay(int& argc, char** argv) {
-  // "-display NAME" belongs to the X layer: take it out as the toolkit would.
-  const char* name = nullptr;
-  for (int i = 1; i + 1 < argc; ++i) {
-    if (argv[i] && strcmp(argv[i], "-display") == 0) {
-      name = argv[i + 1];
-      // The toolkit opens its display from DISPLAY later: keep the choice there.
-      setenv("DISPLAY", name, 1);
-      for (int j = i; j + 2 <= argc; ++j) argv[j] = argv[j + 2];
-      argc -= 2;
-      break;
-    }
-  }
+// Start-up step 6: the toolkit opens the display and takes its own options (-display,
+// -xrm, -geometry, -fg, -bg, -fn, -name, -title, -iconic, -synchronous, ...) out of the
+// arguments, so that the viewer's options and files are what remains.
+ErrorCode openDisplay(int& argc, char** argv, DisplayResources& resources) {
+  bool named = false;
+  for (int i = 1; i + 1 < argc; ++i)
+    if (argv[i] && strcmp(argv[i], "-display") == 0) named = true;
   const char* env = getenv("DISPLAY");
-  if (!name && (!env || !*env)) {
+  if (!named && (!env || !*env)) {
     errno = 0;
     kgFatal("The DISPLAY environment variable is not set.\nPlease set DISPLAY before running %s.\nExiting.\n",
             "Kestrelgauge");
   }
-  Display* d = XOpenDisplay(name);
-  if (!d) {
+  std::string error;
+  if (!OI_Application::open(argc, argv, error)) {
     reportError(displayNotOpened, "%s", errorMessage(displayNotOpened).c_str());
     return displayNotOpened;
   }
-  XCloseDisplay(d);
+  resources.display = OI_Application::instance()->displayResources();
+  resources.commandLine = OI_Application::instance()->commandLineResources();
   return allOK;
 }
 
@@ -76,7 +71,7 @@ int main(int argc, char** argv) {
   kgInstallSignalHandlers();
   StartupSummary prepared;
   bool showWindow = false;
-  ErrorCode rc = runProgram(argc, argv, checkDisplay, prepared, showWindow);
+  ErrorCode rc = runProgram(argc, argv, openDisplay, prepared, showWindow);
   if (showWindow) rc = showMainWindow(startupState(), prepared);
   exitWithCode(rc);
 }

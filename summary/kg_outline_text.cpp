@@ -19,6 +19,12 @@ KG_SummaryHooks& kgSummaryHooks() {
   return hooks;
 }
 
+namespace {
+unsigned gChosenNameWidth = 0;
+}  // namespace
+
+void kgSetChosenNameColumnWidth(unsigned width) { gChosenNameWidth = clamp_name_column_width(width); }
+
 NameStyle kgNameStyleFromSettings() {
   KG_Settings& s = kgSettings();
   NameStyle n;
@@ -33,7 +39,7 @@ NameStyle kgNameStyleFromSettings() {
   if (s.suppressCplusplusArgumentList.value) bits &= ~unsigned(showArgumentList);
   n.showBits = bits;
   n.nameColumnWidth = clamp_name_column_width(s.nameColumnWidth.value);
-  n.chosenWidth = n.nameColumnWidth;
+  n.chosenWidth = gChosenNameWidth != 0 ? gChosenNameWidth : n.nameColumnWidth;
   return n;
 }
 

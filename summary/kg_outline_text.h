@@ -39,11 +39,17 @@ std::string kgMessageText(const char* resource, const char* fallback);
 
 // The name style the settings describe (directory names, truncation, C++ name parts, width).
 NameStyle kgNameStyleFromSettings();
+// The name column width the user chose last (at start-up or in the name style dialog): a
+// narrower window shrinks the column back to it, never below.
+void kgSetChosenNameColumnWidth(unsigned width);
 
 class KG_OutlineText : public QR_OutlineText {
  public:
   virtual std::uint32_t level() const = 0;
   virtual const char* name() const = 0;
+  // The name in full, as no column width cuts it: a file's whole path, a function's name
+  // with the file that holds it.
+  virtual std::string full_name() const { return name(); }
   // Every child's subtree, then this row's own line.
   virtual void refresh_subtree();
   // Writes exactly `width` characters of a cell into buffer at position.
@@ -141,6 +147,7 @@ class KG_SummaryFile : public KG_OutlineText {
   explicit KG_SummaryFile(SumFile* file) : file_(file) {}
   std::uint32_t level() const override { return 2; }
   const char* name() const override { return file_->name; }
+  std::string full_name() const override { return std::string(file_->dir ? file_->dir->name : "") + file_->name; }
   void cell_text(std::uint32_t column, std::string& buffer, std::size_t position,
                  std::uint32_t width) override;
   void create_children() override;
@@ -165,6 +172,9 @@ class KG_SummaryFunc : public KG_OutlineText {
   KG_SummaryFunc(SumFunc* func, SumFile* file) : func_(func), file_(file) {}
   std::uint32_t level() const override { return 3; }
   const char* name() const override { return func_->name; }
+  std::string full_name() const override {
+    return std::string(func_->name) + "  (" + (file_->dir ? file_->dir->name : "") + file_->name + ")";
+  }
   void cell_text(std::uint32_t column, std::string& buffer, std::size_t position,
                  std::uint32_t width) override;
   SumCounts& counts() override { return func_->counts; }

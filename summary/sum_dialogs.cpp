@@ -175,8 +175,13 @@ void noteList(const std::string& banner, const std::vector<std::string>& message
     XtSetArg(la[n], XmNscrollBarDisplayPolicy, XmSTATIC), ++n;
     XtSetArg(la[n], XmNlistSizePolicy, XmCONSTANT), ++n;
     gNotes.list = XmCreateScrolledList(box, oiStr("kgErrorList"), la, n);
-    // 70 columns of the list's font, roughly.
-    XtVaSetValues(XtParent(gNotes.list), XmNwidth, 70 * 8, nullptr);
+    // 70 columns of the list's own font.
+    XmRenderTable fonts = nullptr;
+    XtVaGetValues(gNotes.list, XmNrenderTable, &fonts, nullptr);
+    if (fonts) {
+      OI_XmString sample(std::string(70, '0'));
+      XtVaSetValues(gNotes.list, XmNwidth, XmStringWidth(fonts, sample), nullptr);
+    }
     XtManageChild(gNotes.list);
     XtManageChild(box);
     XtManageChild(frame);

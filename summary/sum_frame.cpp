@@ -31,6 +31,28 @@
 
 namespace {
 
+// The window's icon ("kgOutlineLogo"): an outline of indented rows with their triangles and
+// a column of figures, 50 x 50.
+const unsigned char* outlineLogoBits() {
+  static unsigned char bits[7 * 50] = {};
+  static const bool made = [] {
+    auto set = [](int x, int y) { bits[y * 7 + x / 8] |= static_cast<unsigned char>(1u << (x % 8)); };
+    for (int x = 2; x < 48; ++x) set(x, 2), set(x, 47);
+    for (int y = 2; y < 48; ++y) set(2, y), set(47, y), set(36, y);
+    const int indent[] = {0, 1, 2, 2, 1, 2, 2, 0};
+    for (int r = 0; r < 8; ++r) {
+      const int y = 6 + r * 5, x0 = 5 + indent[r] * 5;
+      for (int i = 0; i < 3; ++i)
+        for (int k = -i; k <= i; ++k) set(x0 + 2 - i + 2, y + k);  // a small triangle
+      for (int x = x0 + 6; x < x0 + 6 + 14 - indent[r] * 3; ++x) set(x, y);
+      for (int x = 39 + (r % 3); x < 45; ++x) set(x, y);
+    }
+    return true;
+  }();
+  (void)made;
+  return bits;
+}
+
 // The seven cells of the Actions pulldown and the popup menu.
 const char* const kActionCells[][2] = {
     {"QR_OutlineCollapse", "Collapse"},
@@ -77,6 +99,7 @@ ErrorCode KG_SumFrame::build(std::string& error) {
   KG_Settings& s = kgSettings();
   // The application window with its resize and close callbacks.
   window_ = std::make_unique<OI_TopLevel>("kestrel", "Kestrelgauge");
+  window_->setIcon(outlineLogoBits(), 50, 50);
   kgSetDialogHome(shell());
   window_->onClose = [this] { exit_viewer(); };
   window_->onResize = [this](int, int) {
@@ -118,9 +141,15 @@ ErrorCode KG_SumFrame::build(std::string& error) {
   busyBox_->place(wait->widget(), 0, 1, true, true);
   workArea_->place(busyBox_->widget(), 0, 1, true, true);
   busyBox_->unmanage();
+  // Shortened names can look alike: the line under the outline names the row under the
+  // pointer in full.
+  rowName_ = window_->own(std::make_unique<OI_Label>(workArea_->widget(), "kgRowName", " "));
+  XtVaSetValues(rowName_->widget(), XmNalignment, XmALIGNMENT_BEGINNING, nullptr);
+  workArea_->place(rowName_->widget(), 0, 2, true, false);
 
   // The name column width, the heading pane and the outline.
   s.nameColumnWidth.value = static_cast<int>(clamp_name_column_width(s.nameColumnWidth.value));
+  kgSetChosenNameColumnWidth(static_cast<unsigned>(s.nameColumnWidth.value));
   const std::uint32_t width = kgShownWidth(kgShownColumns());
   title_ = gang_->addText("kgTitle", 0, 0, true, false);
   outline_ = gang_->addText("kgOutline", 0, 1, true, true);
@@ -133,6 +162,16 @@ ErrorCode KG_SumFrame::build(std::string& error) {
   buildPopup();
   auto display = std::make_unique<QR_OI_OutlineDisplay>(outline_);
   display_ = display.get();
+  // The summary's vertical bar keeps its own room beside the text, so that it never hides
+  // the last column when many rows make it appear (the window does not grow for it).
+  outline_->setDynamicScrollBars(false);
+  XtAddEventHandler(
+      outline_->text()->widget(), PointerMotionMask | LeaveWindowMask, False,
+      [](Widget, XtPointer client, XEvent* ev, Boolean*) {
+        auto* self = static_cast<KG_SumFrame*>(client);
+        oiGuard("row name", [&] { self->showRowNameAt(ev->type == MotionNotify ? ev->xmotion.y : -1); });
+      },
+      this);
   if (OI_Menu* actions = window_->menuBar("kgTopMenu")->pulldown("kgActions")) {
     display_->add_controlled_widget(actions->widget());
   }
@@ -215,6 +254,7 @@ const char* const kSortMenuCells[] = {
 
 void KG_SumFrame::buildViewMenu(OI_Menu* view) {
   KG_Settings& s = kgSettings();
+  view->addCell("kgColumns", "Select columns", [this] { openColumnsDialog(); });
   sortMenu_ = view->addSubmenu("kgSortBy", "Select sorting order", "kgSort");
   sortMenu_->setRadio(true);
   for (const char* name : kSortMenuCells) {
@@ -228,6 +268,7 @@ void KG_SumFrame::buildViewMenu(OI_Menu* view) {
       if (on && !settingMenus_) set_sort_order(id);
     });
   }
+  view->addCell("kgNames", "Set display style for names", [this] { openNameStyleDialog(); });
   view->addSeparator();
   stripeMenu_ = view->addSubmenu("kgColSeparators", "Vertical column separators", "kgStripes");
   stripeMenu_->setRadio(true);
@@ -262,13 +303,29 @@ void KG_SumFrame::buildPopup() {
     std::string name = c[0];
     popup_->addCell(name, c[1], [this, name] { perform(name); });
   }
-  // Button 3 over the text pops the menu up.
+  // Button 3 over the text pops the menu up; over a row's glyph the glyph's own menu comes
+  // instead (two popups at once would fight over the pointer grab).
   XtAddEventHandler(
       outline_->text()->widget(), ButtonPressMask, False,
       [](Widget, XtPointer client, XEvent* ev, Boolean*) {
-        if (ev->xbutton.button == Button3) static_cast<OI_Menu*>(client)->popupAt(ev);
+        auto* self = static_cast<KG_SumFrame*>(client);
+        if (ev->xbutton.button != Button3) return;
+        if (self->outline_->text()->glyphAt(ev->xbutton.x, ev->xbutton.y)) return;
+        self->popup_->popupAt(ev);
       },
-      popup_);
+      this);
+}
+
+void KG_SumFrame::showRowNameAt(int y) {
+  const QR_OutlineObject* row = nullptr;
+  if (y >= 0 && root_) {
+    const std::uint32_t line = outline_->text()->lineAtY(y);
+    if (line < root_->total_lines()) row = root_->object_at_line(line);
+  }
+  if (row == rowNameOf_) return;
+  rowNameOf_ = row;
+  const auto* text = dynamic_cast<const KG_OutlineText*>(row);
+  rowName_->setLabel(text ? text->full_name() : " ");
 }
 
 void KG_SumFrame::perform(const std::string& actionString) {
@@ -395,6 +452,8 @@ void KG_SumFrame::set_toolbar_visible(bool on) {
   kgSettings().showToolbar.value = on;
   if (on) toolbar_->manage();
   else toolbar_->unmanage();
+  // The outline takes the toolbar's room at once (or gives it back), not at the next resize.
+  workArea_->layout();
   updateToolbarToggleLabel();
 }
 

@@ -15,6 +15,8 @@
 #include "summary/main_window.h"
 #include "support/errors.h"
 
+class KG_ColumnsDialog;
+class KG_NameStyleDialog;
 class KG_OutlineRoot;
 class KG_SummaryOverall;
 class KG_Toolbar;
@@ -53,6 +55,9 @@ class KG_SumFrame {
   void set_sort_order(std::uint32_t order);
   void set_stripes(int setting);
   void set_toolbar_visible(bool on);
+  // The View menu's dialogs.
+  void openColumnsDialog();
+  void openNameStyleDialog();
   const std::string& install_dir() const;
   // The data files shown, with the times they were loaded.
   std::vector<KgvFileRef>& loaded_files();
@@ -79,6 +84,8 @@ class KG_SumFrame {
   void buildActions(OI_Menu* actions);
   void buildHelpMenu();
   void buildDebugMenu(OI_Menu* debug);
+  void columnsChanged();
+  void showRowNameAt(int y);
   void buildPopup();
   void perform(const std::string& actionString);
   void placeHeadings();
@@ -104,12 +111,16 @@ class KG_SumFrame {
   QR_OI_ScrollText* outline_ = nullptr;
   OI_GridBox* busyBox_ = nullptr;
   OI_Label* busyLabel_ = nullptr;
+  OI_Label* rowName_ = nullptr;  // the full name of the row under the pointer
+  const void* rowNameOf_ = nullptr;
   OI_Menu* popup_ = nullptr;
   OI_Menu* sortMenu_ = nullptr;
   OI_Menu* stripeMenu_ = nullptr;
   OI_MenuCell* toolbarToggle_ = nullptr;
   QR_OI_OutlineDisplay* display_ = nullptr;  // owned by the root
   std::unique_ptr<KG_OutlineRoot> root_;
+  std::shared_ptr<KG_ColumnsDialog> columnsDialog_;
+  std::shared_ptr<KG_NameStyleDialog> nameStyleDialog_;
   bool busy_ = false;
   bool settingMenus_ = false;  // the program sets a menu: its callback does nothing
 };

@@ -178,7 +178,12 @@ void KG_SumFrame::updateUserDefaultsFile() {
 
 void KG_SumFrame::writeViewSettingsTo() {
   std::string path;
-  if (!askFile(kgMessageText("writeXdefaultsPrompt", "Write viewer settings to file:").c_str(), path)) return;
+  // The per-user defaults file is proposed: it is where the settings take effect.
+  if (!oiAskFileName(kgDialogHome(), "kgFileDialog", "Kestrelgauge",
+                     kgMessageText("writeXdefaultsPrompt", "Write viewer settings to file:").c_str(), userDefaultsPath(),
+                     path) ||
+      path.empty())
+    return;
   SettingsOutcome o = writeViewSettings(path);
   for (const std::string& w : o.consoleWarnings) kgWarning("%s", w.c_str());
   if (o.code != allOK) show_error(o.code, "File: " + path + "\n" + o.context);

@@ -127,6 +127,28 @@ std::vector<std::string> kgToolbarEntries(const std::string& buttons) {
   return out;
 }
 
+namespace {
+
+// The tip of a button: the label of the menu entry that does the same.
+std::string toolTipFor(const std::string& action) {
+  static const char* const labels[][2] = {
+      {"QR_OutlineNext", "Next"},
+      {"QR_OutlinePrevious", "Previous"},
+      {"QR_OutlineExpand,QR_OutlineMakeVisible", "Expand"},
+      {"QR_OutlineExpand", "Expand"},
+      {"QR_OutlineExpandAll", "Expand all"},
+      {"QR_OutlineCollapse", "Collapse"},
+      {"QR_OutlineCollapseAll", "Collapse all"},
+      {"KG_ScrollToFunction", "Show annotated source"},
+      {"kgStartCRMS", "File a Change Request"},
+  };
+  for (const auto& l : labels)
+    if (action == l[0]) return l[1];
+  return action;
+}
+
+}  // namespace
+
 KG_Toolbar::KG_Toolbar(Widget parent, std::function<void(const std::string&)> perform)
     : OI_Box(parent, "toolbar", OI_Box::horizontal) {
   std::string buttonList = resourceString("buttons", "Buttons");
@@ -137,6 +159,7 @@ KG_Toolbar::KG_Toolbar(Widget parent, std::function<void(const std::string&)> pe
     b->setIcon(bits.data(), 32, 32);
     const std::string bevel = b->resourceString("bevelWidth", "BevelWidth");
     if (!bevel.empty()) b->setBevelWidth(std::atoi(bevel.c_str()));
+    b->setToolTip(toolTipFor(name));
     buttons_.push_back(own(std::move(b)));
   }
 }

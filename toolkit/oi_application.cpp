@@ -33,6 +33,9 @@ XrmOptionDescRec commandLineOptions[] = {
     {oiStr("-fg"), oiStr("*foreground"), XrmoptionSepArg, nullptr},
     {oiStr("-foreground"), oiStr("*foreground"), XrmoptionSepArg, nullptr},
     {oiStr("-iconic"), oiStr(".iconic"), XrmoptionNoArg, oiStr("on")},
+    // The texts draw with their "fontName" (an Xft pattern or a core font name).
+    {oiStr("-fn"), oiStr("*fontName"), XrmoptionSepArg, nullptr},
+    {oiStr("-font"), oiStr("*fontName"), XrmoptionSepArg, nullptr},
 };
 }  // namespace
 
@@ -112,7 +115,10 @@ bool OI_Application::open(int& argc, char** argv, std::string& error, const char
   app->commandLineXrm_ = std::move(xrm);
   Arg args[2];
   XtSetArg(args[0], XmNmappedWhenManaged, False);
-  app->shell_ = XtAppCreateShell(appName, appClass, applicationShellWidgetClass, d, args, 1);
+  // "-name" renames the application for its resources, as in every X program.
+  String name = nullptr, cls = nullptr;
+  XtGetApplicationNameAndClass(d, &name, &cls);
+  app->shell_ = XtAppCreateShell(name ? name : appName, appClass, applicationShellWidgetClass, d, args, 1);
   app->busyCursor_ = XCreateFontCursor(d, XC_watch);
   app->lastActivity_ = oiNowMs();
   theApp = app;

@@ -128,6 +128,15 @@ OI_Frame::OI_Frame(Widget parent, const std::string& name, const std::string& ti
   XtManageChild(w);
 }
 
+void OI_Button::setToolTip(const std::string& text) {
+  if (!widget()) return;
+  XmString current = nullptr;
+  XtVaGetValues(widget(), XmNtoolTipString, &current, nullptr);
+  if (current) return;  // the user's resource
+  OI_XmString s(text);
+  XtVaSetValues(widget(), XmNtoolTipString, static_cast<XmString>(s), nullptr);
+}
+
 OI_OneOfMany::OI_OneOfMany(Widget parent, const std::string& name) {
   Widget w = XmCreateRadioBox(parent, oiStr(name.c_str()), nullptr, 0);
   adopt(w, name);

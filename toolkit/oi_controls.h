@@ -34,6 +34,9 @@ class OI_Button : public OI_Widget {
   // Shows an icon made from X bitmap bits (for example 32x32) in the button's colours.
   void setIcon(const unsigned char* bits, int width, int height);
   void setBevelWidth(int pixels);
+  // The tip shown when the pointer rests on the button, unless a "toolTipString" resource
+  // names one.
+  void setToolTip(const std::string& text);
   // As if the user had pressed it (insensitive buttons do nothing).
   void press();
   std::function<void()> onActivate;

@@ -73,5 +73,8 @@ void OI_ScrollText::attachSharedBar(OI_Side side, OI_ScrollBar* bar) {
 void OI_ScrollText::setDynamicScrollBars(bool on) {
   ownV_->setDynamic(on || !ownV_->texts().size());
   ownH_->setDynamic(on || !ownH_->texts().size());
+  // Shown or hidden now, so that the window's first size already holds a static bar.
+  ownV_->update();
+  ownH_->update();
   layout();
 }

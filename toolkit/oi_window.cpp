@@ -36,11 +36,12 @@ void oiRestoreFocus(Widget w) {
 
 OI_TopLevel::OI_TopLevel(const std::string& name, const std::string& title) {
   OI_Application* app = OI_Application::instance();
-  Arg args[3];
+  Arg args[4];
   XtSetArg(args[0], XmNdeleteResponse, XmDO_NOTHING);
   XtSetArg(args[1], XmNtitle, const_cast<char*>(title.c_str()));
   XtSetArg(args[2], XmNiconName, const_cast<char*>(title.c_str()));
-  Widget shell = XtCreatePopupShell(name.c_str(), topLevelShellWidgetClass, app->shell(), args, 3);
+  XtSetArg(args[3], XmNtoolTipEnable, True);  // buttons that carry tips show them
+  Widget shell = XtCreatePopupShell(name.c_str(), topLevelShellWidgetClass, app->shell(), args, 4);
   adopt(shell, name);
   shell_ = shell;
   main_ = XmCreateMainWindow(shell, oiStr("mainWindow"), nullptr, 0);

@@ -207,8 +207,10 @@ XvfbServer::XvfbServer() {
       dup2(devnull, 2);
     }
     std::string fd = std::to_string(fds[1]);
+    // No reset when the last client goes: what a test puts on the server (xrdb's resources)
+    // must still be there for the program it starts next.
     execlp("Xvfb", "Xvfb", "-displayfd", fd.c_str(), "-screen", "0", "1280x1024x24", "-nolisten",
-           "tcp", static_cast<char*>(nullptr));
+           "tcp", "-noreset", static_cast<char*>(nullptr));
     _exit(127);
   }
   close(fds[1]);
