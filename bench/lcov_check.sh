@@ -30,25 +30,22 @@ for gcda in "$demo"/obj/*.gcda; do
   gcov --branch-probabilities --json-format --stdout "$gcda" 2>/dev/null
 done > "$work/demo.json"
 
-# lcov's figures per file: path LF LH FNF FNH BRF BRH. Repeated records of a line, a
-# function or a branch (a line holding several functions, a header in several objects)
-# are one, their counts added, as lcov reads them.
+# lcov's figures per file: path LF LH FNF FNH BRF BRH. Repeated records of a file, a
+# line, a function or a branch (a header in several objects, a line holding several
+# functions) are one, their counts added, as lcov reads them.
 lcov_figures() {
   awk -F: '
-    function flush(   k, lf, lh, fnf, fnh, brf, brh) {
-      if (sf == "") return
-      for (k in da) { lf++; if (da[k] > 0) lh++ }
-      for (k in fn) { fnf++; if (fnda[k] > 0) fnh++ }
-      for (k in br) { brf++; if (br[k] > 0) brh++ }
-      print sf, lf + 0, lh + 0, fnf + 0, fnh + 0, brf + 0, brh + 0
-      delete da; delete fn; delete fnda; delete br; sf = ""
-    }
-    /^SF:/ { sf = substr($0, 4) }
-    /^DA:/ { split($2, a, ","); da[a[1]] += a[2] }
-    /^FN:/ { fn[substr($2, index($2, ",") + 1)] = 1 }
-    /^FNDA:/ { c = index($2, ","); fnda[substr($2, c + 1)] += substr($2, 1, c - 1) }
-    /^BRDA:/ { v = substr($0, 6); n = split(v, a, ","); t = a[n]; br[substr(v, 1, length(v) - length(t) - 1)] += (t == "-" ? 0 : t) }
-    /^end_of_record/ { flush() }' "$1" | sort
+    /^SF:/ { sf = substr($0, 4); files[sf] = 1 }
+    /^DA:/ { split($2, a, ","); da[sf, a[1]] += a[2] }
+    /^FN:/ { fn[sf, substr($2, index($2, ",") + 1)] = 1 }
+    /^FNDA:/ { c = index($2, ","); fnda[sf, substr($2, c + 1)] += substr($2, 1, c - 1) }
+    /^BRDA:/ { v = substr($0, 6); n = split(v, a, ","); t = a[n]; br[sf, substr(v, 1, length(v) - length(t) - 1)] += (t == "-" ? 0 : t) }
+    END {
+      for (k in da) { split(k, p, SUBSEP); lf[p[1]]++; if (da[k] > 0) lh[p[1]]++ }
+      for (k in fn) { split(k, p, SUBSEP); fnf[p[1]]++; if (fnda[k] > 0) fnh[p[1]]++ }
+      for (k in br) { split(k, p, SUBSEP); brf[p[1]]++; if (br[k] > 0) brh[p[1]]++ }
+      for (f in files) print f, lf[f] + 0, lh[f] + 0, fnf[f] + 0, fnh[f] + 0, brf[f] + 0, brh[f] + 0
+    }' "$1" | sort
 }
 
 # kestrel's figures per file from the export report, without the "(file scope)" function:
