@@ -7,7 +7,6 @@
 #include <climits>
 #include <cstdlib>
 
-#include "support/diagnostic.h"
 #include "support/runtime_options.h"
 
 namespace {
@@ -39,7 +38,7 @@ bool replaceFirst(std::string& s, const std::string& from, const std::string& to
 }
 
 // One ".." step: the first "/../" or a trailing "/..", after any leading run of '.' and '/'.
-bool resolveDotDot(std::string& s, const std::string& original, int& steps) {
+bool resolveDotDot(std::string& s, int& steps) {
   size_t skip = s.find_first_not_of("./");
   if (skip == std::string::npos) return false;
   size_t pos = s.find("/../", skip);
@@ -52,14 +51,14 @@ bool resolveDotDot(std::string& s, const std::string& original, int& steps) {
       return false;
     }
   }
-  if (++steps > 50) {
-    errno = 0;
-    kgFatal("Too many links: attempt to resolve filename %s failed.", original.c_str());
-  }
+  // Following symbolic links could go round for ever; after 50 steps the rest of the ".."
+  // steps are taken on the text alone, which always ends. (A path from a data or
+  // adjustments file may hold any number of them: no reason to stop the program.)
+  const bool followLinks = ++steps <= 50;
   std::string before = s.substr(0, pos);
   std::string after = s.substr(pos + len);  // after "/../" or nothing
   std::string real;
-  if (!before.empty() && realPathOf(before, real) && real != before) {
+  if (followLinks && !before.empty() && realPathOf(before, real) && real != before) {
     // A symbolic link was involved: ".." is relative to where it really leads.
     s = real + s.substr(pos);
     bound(s);
@@ -93,7 +92,7 @@ std::string normalizePath(const std::string& path) {
       s.erase(s.size() - 2);
       continue;
     }
-    if (resolveDotDot(s, path, steps)) continue;
+    if (resolveDotDot(s, steps)) continue;
     break;
   }
   if (s.empty()) s = "/";

@@ -58,6 +58,18 @@ TEST(FilePaths, DotDotAfterASymlinkFollowsTheLink) {
   EXPECT_EQ(normalizePath(base + "/alias/../missing.kgv"), base + "/real/missing.kgv");
 }
 
+TEST(FilePaths, AnyNumberOfDotDotStepsResolvesWithoutStoppingTheProgram) {
+  // A path from a data or adjustments file may hold hundreds of them.
+  std::string path = "/src";
+  for (int i = 0; i < 300; ++i) path += "/d/..";
+  EXPECT_EQ(normalizePath(path + "/a.c"), "/src/a.c");
+  EXPECT_EQ(resolveFilePath(path + "/../x.c"), "/x.c");
+  // The regression input the adjustments reader's fuzz target found reads like any file.
+  const std::string found = kgtest::readFile(kgtest::sourceDir() +
+                                             "/fuzz/regressions/adjustments_reader_fuzz/fifty-one-dotdot-steps.adjust");
+  EXPECT_NE(found.find("/../"), std::string::npos);
+}
+
 TEST(FilePaths, AutomountPrefixIsTranslated) {
   resetRuntimeOptions();
   EXPECT_STREQ(translateAutoMountPath("/tmp_mnt/home/a.kgv"), "/home/a.kgv");
