@@ -45,7 +45,11 @@ configure: deps $(BUILD)/CMakeCache.txt
 build: configure
 	cmake --build $(BUILD) -j$(JOBS)
 
-demo: build
+# The programs alone: the demo needs no tests built.
+programs: configure
+	cmake --build $(BUILD) -j$(JOBS) --target kestrel kestrel-viewer kestrel-import
+
+demo: programs
 	@bash tools/run-demo.sh $(BUILD)
 
 test-release: build

@@ -194,7 +194,7 @@ void writeHeader(GuardedWriter& w, std::time_t when) {
   w.text(hashes).endLine();
 }
 
-void writeFunction(GuardedWriter& w, const SumFile& file, const std::vector<LineState>& states,
+void writeFunction(GuardedWriter& w, const SumFile& file, const LineStates& states,
                    const SumFunc& fn) {
   w.text("fu\t").name(fn.name).tab().number(fn.counts.unusedBlocks).tab().number(fn.counts.blocks);
   w.tab().number(fn.counts.adjUnusedLines).tab().number(fn.counts.adjLines);
@@ -212,10 +212,8 @@ void writeFunction(GuardedWriter& w, const SumFile& file, const std::vector<Line
   }
   if (fn.firstLine != 0) {
     std::uint32_t last = std::min<std::uint32_t>(fn.lastLine, std::uint32_t(states.size()));
-    for (std::uint32_t l = fn.firstLine; l <= last; ++l) {
-      const LineState& s = states[l - 1];
-      if (!(s.flags & LineHasCode)) continue;
-      if ((s.flags & adjAnyMask) && lineUnusedDead(s.flags, s.count)) continue;
+    states.forEachCodeLine(fn.firstLine, last, [&](std::uint32_t l, const LineState& s) {
+      if ((s.flags & adjAnyMask) && lineUnusedDead(s.flags, s.count)) return;
       w.text("li\t").number(l).tab();
       if (s.count != 0) {
         w.number(saturate(s.count));
@@ -223,7 +221,7 @@ void writeFunction(GuardedWriter& w, const SumFile& file, const std::vector<Line
         w.text(exportCountText(true, s.flags, s.count));
       }
       w.endLine();
-    }
+    });
   }
   w.text("efu\t").name(fn.name).endLine();
 }
@@ -259,7 +257,7 @@ ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when, Messa
       w.tab().number(fc.adjUnusedLines).tab().number(fc.adjLines).tab().number(f->unusedFuncs);
       w.tab().number(f->funcs).tab().number(saturate(f->sessions));
       w.endLine();
-      const std::vector<LineState>& states = lineStates.of(*f);
+      const LineStates& states = lineStates.of(*f);
       for (const SumFunc* fn : f->funcOrder) writeFunction(w, *f, states, *fn);
       w.text("efi\t").name(f->name).endLine();
     }

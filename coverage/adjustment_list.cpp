@@ -35,6 +35,12 @@ AdjustEntry* AdjustmentList::findEntry(const std::string& path) {
 
 CvgAdjustSet* AdjustmentList::findSet(const std::string& path, int* pos) {
   int i = position(path);
+  // Data may name a source relatively or through a symbolic link, while entries read from
+  // the file carry resolved paths: the same file either way.
+  if (i < 0 && !entries_.empty()) {
+    const std::string resolved = resolveFilePath(path);
+    if (resolved != path) i = position(resolved);
+  }
   if (pos) *pos = i;
   return i < 0 ? nullptr : entries_[static_cast<std::size_t>(i)].set();
 }

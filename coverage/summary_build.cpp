@@ -7,32 +7,48 @@
 #include <new>
 #include <string_view>
 #include <unordered_map>
+#include <unordered_set>
 #include <utility>
 
+#include "coverage/kgv_file_ref.h"
 #include "coverage/string_block.h"
 #include "coverage/summary_sort.h"
 #include "support/string_helpers.h"
 
 namespace {
 
-constexpr std::uint32_t kMaxSourceLines = 1u << 24;
-
 // Adjustment sets by path, first entry of a path winning as in the list's own lookup.
 class AdjustIndex {
  public:
   explicit AdjustIndex(const AdjustmentList& list) {
     sets_.reserve(list.size());
-    for (const AdjustEntry& e : list.entries()) sets_.emplace(e.resolvedName(), e.set());
+    for (const AdjustEntry& e : list.entries()) {
+      sets_.emplace(e.resolvedName(), e.set());
+      names_.insert(std::string(baseName(e.resolvedName())));
+    }
   }
+  // By the data's path, else by the file it resolves to: data may name a source relatively
+  // or through a symbolic link, while entries carry resolved paths. Only a file whose name
+  // some entry has is resolved, so that data of many files costs no system call per file.
   const CvgAdjustSet* find(const SumDir& dir, const SumFile& file) const {
     if (sets_.empty()) return nullptr;
     std::string path = std::string(dir.name) + file.name;
     auto it = sets_.find(path);
+    if (it == sets_.end() && names_.count(std::string(baseName(path))) != 0) {
+      const std::string resolved = resolveFilePath(path);
+      if (resolved != path) it = sets_.find(resolved);
+    }
     return it == sets_.end() ? nullptr : it->second;
   }
 
  private:
-  std::unordered_map<std::string_view, const CvgAdjustSet*> sets_;
+  static std::string_view baseName(std::string_view path) {
+    const std::size_t slash = path.rfind('/');
+    return slash == std::string_view::npos ? path : path.substr(slash + 1);
+  }
+
+  std::unordered_map<std::string, const CvgAdjustSet*> sets_;
+  std::unordered_set<std::string> names_;
 };
 
 std::uint32_t adjustBits(const CvgAdjustSet* set, std::uint32_t line) {
@@ -176,9 +192,6 @@ ErrorCode FileCounter::run() {
           account(fn.counts, l, c);
           fn.lastLine = l;
         }
-        // No source file has this many lines; such a number can only come from damaged
-        // data, and the line states for it would exhaust memory.
-        if (fn.lastLine > kMaxSourceLines) return corruptKgvFile;
         f_.lineCount = std::max(f_.lineCount, fn.lastLine);
       }
     }
@@ -196,28 +209,22 @@ ErrorCode FileCounter::run() {
   return allOK;
 }
 
-void markLine(std::vector<LineState>& states, std::uint32_t lineNo, std::uint32_t flag) {
-  if (lineNo != 0 && lineNo <= states.size()) states[lineNo - 1].flags |= flag;
-}
-
 // The state of one class pass over a file's lines.
 struct ClassPass {
-  std::size_t previous = 0;  // 1-based line of the previous relevant line; 0 = none
+  std::size_t previous = 0;  // 1-based position of the previous relevant line; 0 = none
   std::uint32_t previousClass = 0;
   bool inFunction = false;
 
-  // The class of line l; lines between two relevant lines of the same class in a function
-  // are filled through `store`.
-  template <typename Store>
-  std::uint32_t step(std::vector<LineState>& states, std::size_t l, std::uint32_t flags,
-                     bool relevant, bool good, Store store) {
+  // The class of the line at position l; lines between two relevant lines of the same class
+  // in a function are filled through `store` (at(k) gives the line at position k).
+  template <typename At, typename Store>
+  std::uint32_t step(At at, std::size_t l, std::uint32_t flags, bool relevant, bool good, Store store) {
     std::uint32_t cls = ClassNothing;
     if (flags & LineFuncStart) inFunction = true;
     if (relevant) {
       cls = good ? ClassUsed : ClassUnused;
       if (cls == previousClass && inFunction && previous != 0) {
-        for (std::size_t k = previous + 1; k < l; ++k)
-          store(states[k - 1], good ? ClassBetweenUsed : ClassBetweenUnused);
+        for (std::size_t k = previous + 1; k < l; ++k) store(at(k), good ? ClassBetweenUsed : ClassBetweenUnused);
       }
       previous = l;
       previousClass = cls;
@@ -230,14 +237,14 @@ struct ClassPass {
   }
 };
 
-}  // namespace
-
 // Both passes in one walk: actual (relevant = has code, good = used) and adjusted
-// (relevant = counts for adjusted coverage, good = adjusted used).
-void classifyLines(std::vector<LineState>& states) {
+// (relevant = counts for adjusted coverage, good = adjusted used); at(l) is the line at
+// position l (1-based).
+template <typename At>
+void classify(std::size_t count, At at) {
   ClassPass actual, adjusted;
-  for (std::size_t l = 1; l <= states.size(); ++l) {
-    LineState& s = states[l - 1];
+  for (std::size_t l = 1; l <= count; ++l) {
+    LineState& s = at(l);
     std::uint32_t flags = s.flags;
     bool code = (flags & LineHasCode) != 0;
     bool used = code && s.count != 0;
@@ -247,22 +254,50 @@ void classifyLines(std::vector<LineState>& states) {
       adjRelevant = lineCountsForAdjusted(flags, s.count);
       adjGood = lineAdjustedUsed(flags, s.count);
     }
-    s.actualClass = actual.step(states, l, flags, code, used,
-                                [](LineState& t, std::uint32_t c) { t.actualClass = c; });
-    s.adjustedClass = adjusted.step(states, l, flags, adjRelevant, adjGood,
-                                    [](LineState& t, std::uint32_t c) { t.adjustedClass = c; });
+    s.actualClass = actual.step(at, l, flags, code, used, [](LineState& t, std::uint32_t c) { t.actualClass = c; });
+    s.adjustedClass =
+        adjusted.step(at, l, flags, adjRelevant, adjGood, [](LineState& t, std::uint32_t c) { t.adjustedClass = c; });
   }
+}
+
+}  // namespace
+
+void classifyLines(std::vector<LineState>& states) {
+  classify(states.size(), [&](std::size_t l) -> LineState& { return states[l - 1]; });
+}
+
+void classifyLineUnits(std::vector<LineState*>& units) {
+  classify(units.size(), [&](std::size_t l) -> LineState& { return *units[l - 1]; });
 }
 
 namespace {
 
-// Damaged line numbers are noted through `messages` when they are to be reported.
 void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
-                     MessageSink& messages, std::vector<LineState>& states) {
-  states.assign(f.lineCount, LineState{});
-  if (f.lineCount == 0) return;
+                     MessageSink& messages, LineStates& states) {
+  if (f.lineCount == 0 || !f.record) {
+    states.clear();
+    return;
+  }
   const std::vector<std::uint32_t>& map = f.record->map;
   const std::vector<std::uint16_t>& counts = f.record->counts;
+  // Every line the map names stands alone; the adjustments' ranges split the rest, so that
+  // each segment has one set of adjustment bits.
+  std::vector<std::uint32_t> singles, boundaries;
+  for (std::uint32_t e : map) {
+    const std::uint32_t tag = mapTag(e);
+    if (tag == TagFuncLine || tag == TagBlock || tag == TagBlockLine) singles.push_back(mapValue(e));
+  }
+  if (set) {
+    set->iterateRanges([&](CvgAdjust, std::uint32_t first, std::uint32_t last) {
+      boundaries.push_back(first);
+      if (last < UINT32_MAX) boundaries.push_back(last + 1);
+      return true;
+    });
+  }
+  states.reset(f.lineCount, std::move(singles), std::move(boundaries));
+  auto mark = [&](std::uint32_t line, std::uint32_t flag) {
+    if (LineState* s = states.single(line)) s->flags |= flag;
+  };
   std::uint32_t last = 0;
   std::uint16_t blockCount = 0;
   bool reported = false;
@@ -270,8 +305,8 @@ void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet*
     std::uint32_t tag = mapTag(map[i]);
     std::uint32_t v = mapValue(map[i]);
     if (tag == TagFuncLine) {
-      markLine(states, last, LineFuncEnd);
-      markLine(states, v, LineFuncStart);
+      mark(last, LineFuncEnd);
+      mark(v, LineFuncStart);
       last = v;
     } else if (tag == TagBlock || tag == TagBlockLine) {
       if (tag == TagBlock) blockCount = i < counts.size() ? counts[i] : 0;
@@ -286,23 +321,21 @@ void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet*
         }
         continue;
       }
-      if (v != 0) {
-        LineState& s = states[v - 1];
-        if (s.flags & LineHasCode) {
-          s.count = combineHits(policy, s.count, blockCount);
+      if (LineState* s = states.single(v)) {
+        if (s->flags & LineHasCode) {
+          s->count = combineHits(policy, s->count, blockCount);
         } else {
-          s.count = blockCount;
-          s.flags |= LineHasCode | adjustBits(set, v);
+          s->count = blockCount;
+          s->flags |= LineHasCode | adjustBits(set, v);
         }
       }
       last = v;
     }
   }
-  markLine(states, last, LineFuncEnd);
-  if (set) {
-    for (std::uint32_t l = 1; l <= f.lineCount; ++l) states[l - 1].flags |= set->lineKinds(l);
-  }
-  classifyLines(states);
+  mark(last, LineFuncEnd);
+  // Lines without code keep their adjustment bits too; a segment's lines share theirs.
+  if (set) states.forEachSegment([&](std::uint32_t first, std::uint32_t, LineState& s) { s.flags |= set->lineKinds(first); });
+  states.classify();
 }
 
 void addTimes(std::uint32_t& first, std::uint32_t& last, std::uint32_t f, std::uint32_t l) {
@@ -344,7 +377,6 @@ ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustInd
         buildLineStates(f, policy, index.find(d, f), messages, f.lineStates);
       } else {
         f.lineStates.clear();
-        f.lineStates.shrink_to_fit();
       }
     }
   }
@@ -600,7 +632,7 @@ LazyLineStates::LazyLineStates(const AdjustmentList& adjustments, std::uint32_t 
 
 LazyLineStates::~LazyLineStates() = default;
 
-const std::vector<LineState>& LazyLineStates::of(const SumFile& file) {
+const LineStates& LazyLineStates::of(const SumFile& file) {
   if (file.lineCount == 0 || !file.lineStates.empty() || !file.dir || !file.record)
     return file.lineStates;
   buildLineStates(file, policy_, index_->sets.find(*file.dir, file), messages_, scratch_);

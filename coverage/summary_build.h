@@ -34,6 +34,8 @@ bool corruptedLinesReported();
 // relevant lines of one class inside a function take the between class. (The summary does this
 // for every file; an editor of adjustments redoes it for its copy of a file's lines.)
 void classifyLines(std::vector<LineState>& states);
+// The same over lines given one by one (a line may stand for a run of alike lines).
+void classifyLineUnits(std::vector<LineState*>& units);
 
 // Builds the whole tree and sorts it. The data's maps may be reordered in place where a
 // function's blocks are out of line order. On failure nothing is handed back. Without line
@@ -67,12 +69,12 @@ class LazyLineStates {
   LazyLineStates(const LazyLineStates&) = delete;
   LazyLineStates& operator=(const LazyLineStates&) = delete;
   // Valid until the next call.
-  const std::vector<LineState>& of(const SumFile& file);
+  const LineStates& of(const SumFile& file);
 
  private:
   struct Index;
   std::unique_ptr<Index> index_;
   std::uint32_t policy_;
   MessageSink& messages_;
-  std::vector<LineState> scratch_;
+  LineStates scratch_;
 };

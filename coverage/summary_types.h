@@ -8,6 +8,7 @@
 #include "coverage/cvg_adjust.h"
 #include "coverage/kgv_data.h"
 #include "coverage/line_state.h"
+#include "coverage/line_states.h"
 
 struct SumCounts {
   std::uint32_t lines = 0;           // lines with code
@@ -66,7 +67,7 @@ struct SumFile {
   ObjRecord* record = nullptr;  // not owned
   SumDir* dir = nullptr;
   std::uint32_t lineCount = 0;
-  std::vector<LineState> lineStates;  // index 0 = line 1; empty until built
+  LineStates lineStates;  // index 0 = line 1; empty until built
 };
 
 struct SumDir {

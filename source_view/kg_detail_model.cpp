@@ -141,7 +141,11 @@ LoadedSourceAdjustments KG_DetailModel::rescanMarkers(const std::string& dirName
 }
 
 void KG_DetailModel::takeLineStates(const SumFile& file) {
-  states_ = file.lineStates;
+  // The text's lines, and those the data has beyond a source that shrank since; but a line
+  // number far past the text's end costs no memory here.
+  const auto textLines = static_cast<std::uint32_t>(std::min<std::size_t>(text_.lineCount(), 0x0FFFFFFF));
+  const std::uint32_t beyond = std::min<std::uint32_t>(file.lineStates.size(), textLines + 100000);
+  states_ = file.lineStates.dense(std::max<std::uint32_t>({1, textLines, beyond}));
   fileName_ = file.name;
   dirName_ = file.dir != nullptr ? file.dir->name : "";
   // The summary's lines carry the adjustments of when it was counted; edits not saved since

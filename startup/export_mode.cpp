@@ -10,7 +10,7 @@
 ErrorCode runExportMode(StartupSummary& prepared) {
   if (prepared.loadStatus == mergeIgnored) reportOutOfDate(prepared.ignored);
   reportAdjustmentProblems(prepared.adjustmentProblems);
-  ConsoleMessages console;
+  ConsoleMessages console(true);
   ErrorCode rc = writeExport(stdout, *prepared.summary, console);
   if (rc != allOK) {
     reportError(rc, "Couldn't export\n%s\n", errorMessage(rc).c_str());

@@ -13,7 +13,7 @@ ErrorCode runExtractMode(StartupSummary& prepared) {
   if (prepared.loadStatus == mergeIgnored) reportOutOfDate(prepared.ignored);
   reportAdjustmentProblems(prepared.adjustmentProblems);
   AlwaysContinue goOn;
-  ConsoleMessages console;
+  ConsoleMessages console(true);
   ExtractionOutcome outcome = extractAllAdjustments(*prepared.summary, "", goOn, console);
   for (const std::string& line : outcome.lines) {
     fputs(line.c_str(), stdout);

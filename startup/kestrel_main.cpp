@@ -48,7 +48,15 @@ std::string installationDirectory() {
 }  // namespace
 
 int main(int argc, char** argv) {
-  if (argc < 2 || !isMode(argv[1])) {
+  std::vector<char*> in(argv, argv + argc);
+  // "kestrel -help" and "kestrel -version" without a mode: what the usage message advises
+  // must work, so they run as the console export mode would, which prints them and stops.
+  std::string exportMode = "-export";
+  bool onlyHelp = in.size() >= 2;
+  for (size_t i = 1; i < in.size(); ++i)
+    onlyHelp = onlyHelp && (strcmp(in[i], "-help") == 0 || strcmp(in[i], "-version") == 0);
+  if (onlyHelp) in.insert(in.begin() + 1, exportMode.data());
+  if (in.size() < 2 || !isMode(in[1])) {
     fflush(stdout);
     fputs(kUsage, stderr);
     return 11;
@@ -62,9 +70,9 @@ int main(int argc, char** argv) {
   std::string home = "-kestrelhome=" + dir;
   std::vector<char*> args;
   args.push_back(const_cast<char*>(viewer.c_str()));
-  args.push_back(argv[1]);
+  args.push_back(in[1]);
   args.push_back(const_cast<char*>(home.c_str()));
-  for (int i = 2; i < argc; ++i) args.push_back(argv[i]);
+  for (size_t i = 2; i < in.size(); ++i) args.push_back(in[i]);
   args.push_back(nullptr);
   execv(viewer.c_str(), args.data());
   perror(viewer.c_str());

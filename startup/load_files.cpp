@@ -17,7 +17,7 @@ ErrorCode loadStartupFiles(StartupState& s, std::unique_ptr<KgvData>& data,
   setLockingEnabled(s.lockingEnabled);
 
   size_t index = 0;
-  ConsoleMessages console;
+  ConsoleMessages console(s.mode != RunMode::view);
   ErrorCode rc = loadAllKgvFiles(s.loadedFiles, s.mergeMode, &ignored, console, data, index);
   if (rc != allOK && rc != mergeIgnored) {
     std::string name = index < s.loadedFiles.size() ? s.loadedFiles[index].givenName : "";

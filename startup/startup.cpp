@@ -7,6 +7,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <deque>
 
 #include "adjust/adjustments_file.h"
 #include "coverage/adjustment_list.h"
@@ -97,6 +98,23 @@ const char* languageArgument(int argc, char** argv) {
   return nullptr;
 }
 
+// "-language xx" becomes "-language=xx", so that the value is the option's and not taken
+// for a data file by the option parser.
+void joinLanguageValue(int& argc, char** argv) {
+  static std::deque<std::string> joined;  // the texts argv points at, kept for the run
+  for (int i = 1; i < argc; ++i) {
+    const char* a = argv[i];
+    if (!a || strncmp(a, "-language", 9) != 0) continue;
+    if (a[9] != '\0') return;  // "-language=xx" or another option: settled
+    if (i + 1 >= argc) return;
+    joined.push_back(std::string("-language=") + argv[i + 1]);
+    argv[i] = joined.back().data();
+    for (int j = i + 1; j + 1 < argc; ++j) argv[j] = argv[j + 1];
+    argv[--argc] = nullptr;
+    return;
+  }
+}
+
 }  // namespace
 
 std::vector<KgvFileRef> buildFileList(const std::vector<std::string>& fileArgs) {
@@ -147,6 +165,7 @@ ErrorCode runProgram(int argc, char** argv, DisplayCheck displayCheck, StartupSu
 
   // 5. Language.
   s.language = kgChooseLanguage(languageArgument(argc, argv));
+  joinLanguageValue(argc, argv);
 
   // 6. The display, for the window only.
   DisplayResources displayResources;
@@ -277,7 +296,7 @@ ErrorCode prepareStartupSummary(StartupState& s, StartupSummary& out) {
   // The report alone reads each file's line states once: they are made as it goes, except
   // when damaged line numbers are to be reported before anything else.
   bool lineStatesLater = s.mode == RunMode::exportReport && !corruptedLinesReported();
-  ConsoleMessages console;
+  ConsoleMessages console(s.mode != RunMode::view);
   rc = buildSummary(*out.data, out.sortOrder, out.hitsPolicy, adjustmentList(), console, out.summary,
                     !lineStatesLater);
   if (rc != allOK) {

@@ -10,7 +10,8 @@ void ConsoleMessages::warning(const std::string& text) {
 }
 
 void ConsoleMessages::notice(const std::string& text) {
-  fflush(stderr);
-  fputs(text.c_str(), stdout);
-  fflush(stdout);
+  FILE* to = noticesToStderr_ ? stderr : stdout;
+  fflush(to == stdout ? stderr : stdout);
+  fputs(text.c_str(), to);
+  fflush(to);
 }

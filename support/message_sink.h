@@ -19,8 +19,14 @@ class MessageSink {
 // interleave as they were produced. The texts carry their own line ends.
 class ConsoleMessages : public MessageSink {
  public:
+  // Notices go to standard output in the window mode; the console modes keep standard
+  // output for their report, so there they go to standard error.
+  explicit ConsoleMessages(bool noticesToStandardError = false) : noticesToStderr_(noticesToStandardError) {}
   void warning(const std::string& text) override;
   void notice(const std::string& text) override;
+
+ private:
+  bool noticesToStderr_;
 };
 
 // Keeps the messages in order.

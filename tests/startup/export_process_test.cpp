@@ -2,6 +2,7 @@
 // standard output, notes on standard error, the user's sort order, pipes closed early.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <map>
 #include <sstream>
@@ -250,4 +251,60 @@ TEST(ExportCommand, TheHitsPolicyComesFromTheEnvironment) {
   EXPECT_EQ(policy("min"), "0");
   EXPECT_EQ(policy("la_st"), "0");
   EXPECT_EQ(policy("most"), "3");  // unknown: the default
+}
+
+TEST(ExportCommand, FunctionsAtTheHighestLineNumbersLoad) {
+  Home home;
+  for (const std::string text : {"record d/far.c\nfunction f line=0x0FFFFFF0 calls=1\nblock 0x0FFFFFF0 hits=3\n",
+                                 "record d/far.c\nfunction f line=50000000\n",
+                                 "record d/far.c\nfunction f line=1 calls=1\nblock 2 hits=1\nblock 0x0FFFFFFF\n"}) {
+    std::string data = kgtest::makeKgv(home.dir, "far.kgv", text);
+    auto r = runProcess({kestrel(), "-export", data}, home.env());
+    ASSERT_EQ(r.status, 0) << text << r.err;
+    EXPECT_EQ(r.err, "");
+    EXPECT_NE(r.out.find("\nfi\tfar.c\t"), std::string::npos) << r.out;
+    EXPECT_NE(r.out.find("\nfu\tf\t"), std::string::npos) << r.out;
+  }
+  // The highest line is reported with its count.
+  std::string data = kgtest::makeKgv(home.dir, "far.kgv",
+                                     "record d/far.c\nfunction f line=0x0FFFFFF0 calls=1\nblock 0x0FFFFFF0 hits=3\n");
+  auto r = runProcess({kestrel(), "-export", data}, home.env());
+  EXPECT_NE(r.out.find("li\t" + std::to_string(0x0FFFFFF0) + "\t3\n"), std::string::npos) << r.out;
+}
+
+TEST(ExportCommand, AdjustmentsMeetSourcesNamedRelativelyOrThroughALink) {
+  Home home;
+  ASSERT_EQ(mkdir(home.dir.file("real").c_str(), 0755), 0);
+  ASSERT_EQ(mkdir(home.dir.file("real/src").c_str(), 0755), 0);
+  ASSERT_EQ(symlink("real", home.dir.file("link").c_str()), 0);
+  kgtest::writeFile(home.dir.file("real/src/m.c"), "int m() {\n  return 1; /* kestrel: inspected */\n}\n");
+  const std::string relative =
+      kgtest::makeKgv(home.dir, "rel.kgv", "record src/m.c\nfunction m line=1\nblock 2\n");
+  const std::string linked = kgtest::makeKgv(
+      home.dir, "link.kgv", "record " + home.dir.file("link/src/m.c") + "\nfunction m line=1\nblock 2\n");
+  // Marks extracted by one name are seen by the other, run from inside the link.
+  const std::string cwd = home.dir.file("link");
+  auto r = runProcess({kestrel(), "-extract", relative}, home.env(), "", cwd);
+  ASSERT_EQ(r.status, 0) << r.err;
+  for (const std::string& data : {relative, linked}) {
+    r = runProcess({kestrel(), "-export", data}, home.env(), "", cwd);
+    ASSERT_EQ(r.status, 0) << r.err;
+    EXPECT_NE(r.out.find("li\t2\tINSP\n"), std::string::npos) << data << "\n" << r.out;
+  }
+  // And the other way round, with a fresh adjustments file.
+  ASSERT_EQ(unlink(home.dir.file(".kestrel.adjust").c_str()), 0);
+  r = runProcess({kestrel(), "-extract", linked}, home.env(), "", home.dir.path());
+  ASSERT_EQ(r.status, 0) << r.err;
+  r = runProcess({kestrel(), "-export", relative}, home.env(), "", cwd);
+  ASSERT_EQ(r.status, 0) << r.err;
+  EXPECT_NE(r.out.find("li\t2\tINSP\n"), std::string::npos) << r.out;
+}
+
+TEST(ExportCommand, TheLanguageGivenAsTheNextArgumentLeavesTheDataFilesAlone) {
+  Home home;
+  std::string data = kgtest::makeKgv(home.dir, "two.kgv", kTwoFiles);
+  auto r = runProcess({kestrel(), "-export", "-language", "C", data}, home.env());
+  EXPECT_EQ(r.status, 0) << r.err;
+  EXPECT_EQ(r.err, "");
+  EXPECT_EQ(fileRecords(r.out), (std::vector<std::string>{"big.c", "a.c"}));
 }

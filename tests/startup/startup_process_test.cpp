@@ -91,6 +91,31 @@ TEST(StartUp, HelpAndVersionPrintBothTextsAndSucceed) {
   EXPECT_TRUE(std::regex_search(r.err, banner)) << r.err;
 }
 
+TEST(ProductCommand, HelpAndVersionWithoutAModeDoWhatTheUsageMessageAdvises) {
+  for (const char* option : {"-help", "-version"}) {
+    auto alone = runProcess({kestrel(), option}, plainEnv());
+    auto withMode = runProcess({kestrel(), "-export", option}, plainEnv());
+    EXPECT_EQ(alone.status, 0) << option;
+    EXPECT_EQ(alone.err, withMode.err) << option;
+    EXPECT_EQ(alone.out, "");
+  }
+  EXPECT_EQ(runProcess({kestrel(), "-help"}, plainEnv()).err.rfind("Example:\n", 0), 0u);
+  EXPECT_EQ(runProcess({kestrel(), "-version"}, plainEnv()).err.rfind("Kestrelgauge viewer ", 0), 0u);
+  // With anything else the mode is still needed.
+  auto r = runProcess({kestrel(), "-help", "a.kgv"}, plainEnv());
+  EXPECT_EQ(r.status, 11);
+  EXPECT_EQ(r.err, kUsageError);
+}
+
+TEST(StartUp, TheLanguageGivenAsTheNextArgumentIsNoDataFile) {
+  auto apart = runProcess({viewer(), "-export", home(), "-language", "fr"}, plainEnv());
+  auto joined = runProcess({viewer(), "-export", home(), "-language=fr"}, plainEnv());
+  EXPECT_EQ(apart.status, 9);
+  EXPECT_EQ(apart.err, joined.err);
+  EXPECT_EQ(apart.err, "Kestrelgauge viewer: Warning: Unknown language \"fr\", using English.\n" +
+                           std::string(kNoFiles));
+}
+
 TEST(StartUp, OptionErrorsAreReportedAndStartUpGoesOn) {
   auto r = runProcess({viewer(), "-export", home(), "-help=1", "-sort", "-bogus", "-VERBOSE=1",
                        "-locking=OFF"},
