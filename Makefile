@@ -16,9 +16,10 @@ PKGS := g++ cmake pkg-config ca-certificates \
         zlib1g-dev nlohmann-json3-dev \
         clang libclang-rt-14-dev \
         xvfb xdotool x11-apps x11-utils x11-xserver-utils imagemagick xfonts-base fonts-dejavu-core \
+        fonts-ipafont-gothic groff-base \
         lcov time
 
-.PHONY: all deps configure build demo test test-release test-asan fuzz bench lcov-check clean
+.PHONY: all deps configure build programs demo test test-release test-asan fuzz bench lcov-check clean
 
 all: build
 
@@ -47,7 +48,7 @@ build: configure
 
 # The programs alone: the demo needs no tests built.
 programs: configure
-	cmake --build $(BUILD) -j$(JOBS) --target kestrel kestrel-viewer kestrel-import
+	cmake --build $(BUILD) -j$(JOBS) --target kestrel kestrel-viewer kestrel-import kg-help
 
 demo: programs
 	@bash tools/run-demo.sh $(BUILD)

@@ -147,7 +147,8 @@ KG_Settings::KG_Settings(const ResourceSource& src)
       showBlocksPercentUnused(src, "showBlocksPercentUnused", false, true),
       showBlocksUsed(src, "showBlocksUsed", false, true),
       showBlocksPercentUsed(src, "showBlocksPercentUsed", false, true),
-      showBlocksTotal(src, "showBlocksTotal", false, true) {}
+      showBlocksTotal(src, "showBlocksTotal", false, true),
+      helpBrowserCommand(src, "helpBrowserCommand", "xdg-open", false) {}
 
 KG_Settings& buildSettings(const ResourceSource& src) {
   // The old table leaves the registry before the new one enters it.

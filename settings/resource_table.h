@@ -158,10 +158,14 @@ struct KG_Settings {
   KG_BoolResource showBlocksUsed;
   KG_BoolResource showBlocksPercentUsed;
   KG_BoolResource showBlocksTotal;
+
+  // Beyond the classic table: the Help menus run it with the manual's file URL as its last
+  // argument.
+  KG_StrResource helpBrowserCommand;
 };
 
 // The number of resource objects in the table.
-constexpr size_t kSettingsResourceCount = 136;
+constexpr size_t kSettingsResourceCount = 137;
 
 // Builds the table from a database, replacing any earlier one. Conversion problems go to
 // src.warnings.

@@ -16,6 +16,7 @@
 #include "settings/resource_table.h"
 #include "source_view/kg_navigation.h"
 #include "source_view/kg_panes.h"
+#include "summary/help_browser.h"
 #include "summary/kg_outline_text.h"
 #include "summary/sum_dialogs.h"
 #include "summary/sum_timing.h"
@@ -220,6 +221,9 @@ void KG_FileDetail::buildMenus() {
     });
   }
   OI_Menu* help = bar->addPulldown("kgHelpPulldown", "Help", "kgHelp");
+  kgAddContextHelp(help, kgSourceWindowContextTopics(), "the-annotated-source-window", [this] { return shell(); });
+  kgAddHelpTopics(help, kgSourceWindowHelpTopics(), [this] { return shell(); });
+  help->addSeparator();
   help->addCell("kgProductInfo", "Product information", [this] {
     if (versionText) show_message(OI_Severity::information, versionText(), shell());
   });

@@ -22,7 +22,8 @@ TEST(ResourceTable, EveryResourceIsRegisteredOnceInTableOrder) {
   for (KG_Resource* r : reg) names.insert(r->name());
   EXPECT_EQ(names.size(), kSettingsResourceCount);
   // Landmarks of the order: first, the texts between the update command and the adjustment
-  // switches, the cursor, and the column switches last.
+  // switches, the cursor, the column switches, and the newer resources after the classic
+  // table.
   EXPECT_STREQ(reg.front()->name(), "directoryNames");
   EXPECT_EQ(reg[46], &s.xdefaultsUpdateCommandString);
   EXPECT_STREQ(reg[47]->name(), "actualCoverageShown");
@@ -30,7 +31,8 @@ TEST(ResourceTable, EveryResourceIsRegisteredOnceInTableOrder) {
   EXPECT_EQ(reg[85], &s.deleteGUIAdjustments);
   EXPECT_EQ(reg[88], &s.adjustEditCursor);
   EXPECT_STREQ(reg[101]->name(), "showNumberOfDirectories");
-  EXPECT_STREQ(reg.back()->name(), "showBlocksTotal");
+  EXPECT_STREQ(reg[135]->name(), "showBlocksTotal");
+  EXPECT_EQ(reg.back(), &s.helpBrowserCommand);
   EXPECT_EQ(findResource("summaryLines"), &s.summaryLines);
   EXPECT_EQ(findResource("noSuchSetting"), nullptr);
   EXPECT_EQ(s.summaryLines.fullName, "Kestrelgauge*summaryLines");
