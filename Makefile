@@ -5,9 +5,10 @@ BUILD      ?= build
 ASAN_BUILD ?= build-asan
 FUZZ_BUILD ?= build-fuzz
 JOBS       ?= 2
-# `make fuzz`: seconds per target, and which targets (all when empty).
+# `make fuzz`: seconds per target, which targets (all when empty), more libFuzzer options.
 FUZZ_SECONDS ?= 600
 FUZZ_TARGETS ?=
+FUZZ_FLAGS   ?=
 
 # Everything the build, the tests and the demo need, beyond make and git.
 PKGS := g++ cmake pkg-config ca-certificates \
@@ -69,7 +70,7 @@ fuzz: deps
 	CC=clang CXX=clang++ cmake -S . -B $(FUZZ_BUILD) -DCMAKE_C_COMPILER=clang -DCMAKE_CXX_COMPILER=clang++ \
 	    -DCMAKE_BUILD_TYPE=RelWithDebInfo -DKG_LIBFUZZER=ON
 	cmake --build $(FUZZ_BUILD) -j$(JOBS) --target kg_fuzz_targets
-	bash fuzz/run_fuzz.sh $(FUZZ_BUILD) $(FUZZ_SECONDS) $(FUZZ_TARGETS)
+	FUZZ_FLAGS="$(FUZZ_FLAGS)" bash fuzz/run_fuzz.sh $(FUZZ_BUILD) $(FUZZ_SECONDS) $(FUZZ_TARGETS)
 
 bench: build
 	@for b in bench/*.sh; do [ -f "$$b" ] && bash "$$b" $(BUILD) || exit 1; done

@@ -5,6 +5,7 @@
 # the input that did it is kept in BUILD/fuzz/NAME_artifacts/.
 #
 # usage: fuzz/run_fuzz.sh BUILD SECONDS [NAME...]   (no NAME: every target of the build)
+# FUZZ_FLAGS adds libFuzzer options, e.g. "-fork=1 -ignore_crashes=1" to go on past a known crash.
 set -u
 
 build=${1:?usage: run_fuzz.sh BUILD SECONDS [NAME...]}
@@ -45,25 +46,33 @@ for name in "$@"; do
   # A target's dictionary holds the words of its format that mutation seldom spells out.
   dict=()
   [ -f "$src/dicts/$name.dict" ] && dict=(-dict="$src/dicts/$name.dict")
+  # Inputs that once crashed the target are read at the start: a fault that came back stops it.
+  regressions=()
+  [ -d "$src/regressions/$name" ] && regressions=("$src/regressions/$name")
   started=$SECONDS
   # The working corpus comes first: libFuzzer adds what it finds to the first directory.
   KG_FUZZ_CORPUS=$work nice -n 10 "$exe" \
       -max_total_time="$seconds" -max_len="$(max_len "$name")" -rss_limit_mb=2048 -timeout=30 \
-      -print_final_stats=1 -artifact_prefix="$artifacts/" "${dict[@]}" \
-      "$work" "$src/seeds/$name" >"$log" 2>&1
+      -print_final_stats=1 -artifact_prefix="$artifacts/" "${dict[@]}" ${FUZZ_FLAGS:-} \
+      "$work" "$src/seeds/$name" "${regressions[@]}" >"$log" 2>&1
   rc=$?
   took=$((SECONDS - started))
-  # The last status line ("#N DONE cov: … ft: … corp: …") and the final statistics.
-  last=$(grep -E '^#[0-9]+[[:space:]]' "$log" | tail -n 1)
+  # The last status line ("#N DONE cov: … ft: … corp: …", "#N: cov: …" in fork mode) and the
+  # final statistics, which fork mode does not print: then N of the last line over the time.
+  last=$(grep -E '^#[0-9]+[:[:space:]]' "$log" | tail -n 1)
   execs=$(sed -n 's/^stat::number_of_executed_units: *//p' "$log")
   rate=$(sed -n 's/^stat::average_exec_per_sec: *//p' "$log")
+  [ -n "$execs" ] || execs=$(sed -n 's/^#\([0-9]*\).*/\1/p' <<<"$last")
+  [ -n "$rate" ] || { [ -n "$execs" ] && [ "$took" -gt 0 ] && rate=$((execs / took)); }
   cov=$(sed -n 's/.* cov: \([0-9]*\).*/\1/p' <<<"$last")
   ft=$(sed -n 's/.* ft: \([0-9]*\).*/\1/p' <<<"$last")
-  corp=$(sed -n 's/.* corp: \([0-9]*\/[0-9]*[a-zA-Z]*\).*/\1/p' <<<"$last")
+  corp=$(sed -n 's/.* corp: \([0-9][0-9/]*[a-zA-Z]*\).*/\1/p' <<<"$last")
   line=$(printf '%-26s %6ss  execs %-11s exec/s %-7s cov %-6s ft %-7s corpus %s' \
            "$name" "$took" "${execs:-?}" "${rate:-?}" "${cov:-?}" "${ft:-?}" "${corp:-?}")
-  if [ $rc -ne 0 ]; then
-    line="$line  FAILED (exit $rc)"
+  # With -ignore_crashes a run ends well however many inputs it kept; those count as well.
+  kept=$(find "$artifacts" -type f -newer "$artifacts/.started" ! -name .started | wc -l)
+  if [ $rc -ne 0 ] || [ "$kept" -ne 0 ]; then
+    line="$line  FAILED (exit $rc, $kept inputs kept)"
     failed+=("$name")
     grep -E '^(==[0-9]+==ERROR|SUMMARY|import check failed|.*runtime error)' "$log" | head -n 3
     find "$artifacts" -type f -newer "$artifacts/.started" ! -name .started | sed 's|^|  kept: |'
