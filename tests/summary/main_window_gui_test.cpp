@@ -177,7 +177,7 @@ TEST_F(MainWindow, TheNameColumnFollowsTheWindowBackDownAndTheLastColumnStaysVis
 
 TEST_F(MainWindow, AGlyphsPopupOffersItsOwnEntriesAndTheyWorkByMouse) {
   start();
-  const WidgetInfo& t = *last.find("kgOutline");
+  const WidgetInfo t = *last.find("kgOutline");  // a copy: `last` is replaced below
   // Button 3 on the triangle of the first directory row.
   app->click(t.x + 2 + 3 * 8 + 4, t.y + 17 + 8, 3);
   ASSERT_TRUE(app->waitViewable("QR_OutlineExpand.QR_OutlineExpandAll", &last)) << last.raw().substr(0, 3000);

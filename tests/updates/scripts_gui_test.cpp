@@ -208,14 +208,14 @@ TEST_F(Scripts, TooManyScriptsAreCutAtTheLimitWithAWarning) {
 
 TEST_F(Scripts, AnInstallationWithoutScriptsDoesNotStart) {
   script("readme", "not a script\n", 0644);
-  auto r = runProcess(argv(), {"DISPLAY=" + server.display(), "HOME=" + dir.path()});
+  auto r = runProcess(argv(), {"DISPLAY=" + server.display(), "HOME=" + dir.path(), x11LeakSuppressions()});
   EXPECT_EQ(r.status, 24);
   EXPECT_NE(r.err.find("Couldn't construct viewer window:\nThe directory contained no appropriate entries.\n"
                        "Your Kestrelgauge installation is corrupted.\nThe scripts are missing from " +
                        install + "/scripts."),
             std::string::npos) << r.err;
   ASSERT_EQ(rename((install + "/scripts").c_str(), (install + "/gone").c_str()), 0);
-  r = runProcess(argv(), {"DISPLAY=" + server.display(), "HOME=" + dir.path()});
+  r = runProcess(argv(), {"DISPLAY=" + server.display(), "HOME=" + dir.path(), x11LeakSuppressions()});
   EXPECT_EQ(r.status, 23);
   EXPECT_NE(r.err.find("Directory " + install + "/scripts can't be opened."), std::string::npos) << r.err;
 }
