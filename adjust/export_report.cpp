@@ -85,6 +85,11 @@ class GuardedWriter {
     return *this;
   }
   GuardedWriter& text(const char* s) { return text(std::string_view(s)); }
+  // A literal's length is known at compile time: no strlen for the keys of every line.
+  template <std::size_t N>
+  GuardedWriter& lit(const char (&s)[N]) {
+    return text(std::string_view(s, N - 1));
+  }
   // A name from a data file: a tab or newline in it would split its record and forge
   // others for the scripts that read the report, so every control character becomes "?".
   GuardedWriter& name(std::string_view s) {
@@ -99,13 +104,17 @@ class GuardedWriter {
     return text(s.substr(from));
   }
   GuardedWriter& tab() { return ch('\t'); }
-  // Two digits at a time: most numbers of a report are small line numbers and counts.
   GuardedWriter& number(std::uint32_t v) {
     if (kSize - used_ < 16) flush();
+    used_ = static_cast<std::size_t>(put(buf_.get() + used_, v) - buf_.get());
+    return *this;
+  }
+  // Two digits at a time: most numbers of a report are small line numbers and counts.
+  static char* put(char* q, std::uint32_t v) {
     std::size_t n = 1;
     for (std::uint32_t rest = v; rest >= 10; rest /= 10) ++n;
-    char* q = buf_.get() + used_ + n;
-    used_ += n;
+    char* end = q + n;
+    q = end;
     while (v >= 100) {
       q -= 2;
       q[0] = kDigitPairs[2 * (v % 100)];
@@ -118,7 +127,17 @@ class GuardedWriter {
       q[-2] = kDigitPairs[2 * v];
       q[-1] = kDigitPairs[2 * v + 1];
     }
-    return *this;
+    return end;
+  }
+  // The lines of blocks and source lines, most of a report, are written straight into the
+  // buffer: room() gives space for a line of at most n bytes, took() ends it at `end`.
+  char* room(std::size_t n) {
+    if (kSize - used_ < n) flush();
+    return buf_.get() + used_;
+  }
+  void took(char* end) {
+    used_ = static_cast<std::size_t>(end - buf_.get());
+    if (used_ >= kFlushAt) flush();
   }
   // Ends a line; the buffer goes out once it is nearly full.
   void endLine() {
@@ -196,7 +215,7 @@ void writeHeader(GuardedWriter& w, std::time_t when) {
 
 void writeFunction(GuardedWriter& w, const SumFile& file, const LineStates& states,
                    const SumFunc& fn) {
-  w.text("fu\t").name(fn.name).tab().number(fn.counts.unusedBlocks).tab().number(fn.counts.blocks);
+  w.lit("fu\t").name(fn.name).tab().number(fn.counts.unusedBlocks).tab().number(fn.counts.blocks);
   w.tab().number(fn.counts.adjUnusedLines).tab().number(fn.counts.adjLines);
   w.tab().number(saturate(fn.calls));
   w.endLine();
@@ -206,24 +225,36 @@ void writeFunction(GuardedWriter& w, const SumFile& file, const LineStates& stat
     for (std::size_t i = fn.firstMapIndex; !rec->map.empty() && i <= last; ++i) {
       if (mapTag(rec->map[i]) != TagBlock) continue;
       std::uint32_t hits = i < rec->counts.size() ? rec->counts[i] : 0;
-      w.text("bl\t").number(mapValue(rec->map[i])).tab().number(saturate(hits));
-      w.endLine();
+      char* q = w.room(32);
+      std::memcpy(q, "bl\t", 3);
+      q = GuardedWriter::put(q + 3, mapValue(rec->map[i]));
+      *q++ = '\t';
+      q = GuardedWriter::put(q, saturate(hits));
+      *q++ = '\n';
+      w.took(q);
     }
   }
   if (fn.firstLine != 0) {
     std::uint32_t last = std::min<std::uint32_t>(fn.lastLine, std::uint32_t(states.size()));
     states.forEachCodeLine(fn.firstLine, last, [&](std::uint32_t l, const LineState& s) {
       if ((s.flags & adjAnyMask) && lineUnusedDead(s.flags, s.count)) return;
-      w.text("li\t").number(l).tab();
+      char* q = w.room(48);
+      std::memcpy(q, "li\t", 3);
+      q = GuardedWriter::put(q + 3, l);
+      *q++ = '\t';
       if (s.count != 0) {
-        w.number(saturate(s.count));
+        q = GuardedWriter::put(q, saturate(s.count));
       } else {
-        w.text(exportCountText(true, s.flags, s.count));
+        const char* t = exportCountText(true, s.flags, s.count);
+        const std::size_t n = std::strlen(t);  // "0", "DEAD", "TEST" or "INSP"
+        std::memcpy(q, t, n);
+        q += n;
       }
-      w.endLine();
+      *q++ = '\n';
+      w.took(q);
     });
   }
-  w.text("efu\t").name(fn.name).endLine();
+  w.lit("efu\t").name(fn.name).endLine();
 }
 
 }  // namespace
@@ -239,29 +270,29 @@ ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when, Messa
   GuardedWriter w(stream);
   writeHeader(w, when);
   const SumCounts& t = root.counts;
-  w.text("to\t").number(t.unusedBlocks).tab().number(t.blocks).tab().number(t.adjUnusedLines);
+  w.lit("to\t").number(t.unusedBlocks).tab().number(t.blocks).tab().number(t.adjUnusedLines);
   w.tab().number(t.adjLines).tab().number(root.unusedFuncs).tab().number(root.funcs);
   w.tab().number(root.files).tab().number(root.dirs);
   w.endLine();
   for (const SumDir* d : root.dirOrder) {
     if (w.failed()) break;
     const SumCounts& c = d->counts;
-    w.text("di\t").name(d->name).tab().number(c.unusedBlocks).tab().number(c.blocks);
+    w.lit("di\t").name(d->name).tab().number(c.unusedBlocks).tab().number(c.blocks);
     w.tab().number(c.adjUnusedLines).tab().number(c.adjLines).tab().number(d->unusedFuncs);
     w.tab().number(d->funcs).tab().number(d->files);
     w.endLine();
     for (const SumFile* f : d->fileOrder) {
       if (w.failed()) break;
       const SumCounts& fc = f->counts;
-      w.text("fi\t").name(f->name).tab().number(fc.unusedBlocks).tab().number(fc.blocks);
+      w.lit("fi\t").name(f->name).tab().number(fc.unusedBlocks).tab().number(fc.blocks);
       w.tab().number(fc.adjUnusedLines).tab().number(fc.adjLines).tab().number(f->unusedFuncs);
       w.tab().number(f->funcs).tab().number(saturate(f->sessions));
       w.endLine();
       const LineStates& states = lineStates.of(*f);
       for (const SumFunc* fn : f->funcOrder) writeFunction(w, *f, states, *fn);
-      w.text("efi\t").name(f->name).endLine();
+      w.lit("efi\t").name(f->name).endLine();
     }
-    w.text("edi\t").name(d->name).endLine();
+    w.lit("edi\t").name(d->name).endLine();
   }
   return w.finish();
 }

@@ -1,6 +1,6 @@
 #!/bin/bash
 # Merge throughput: "kestrel -merge" over a large generated data set against cat of the
-# same files, with peak memory. Usage: bench/merge_bench.sh BUILD_DIR
+# same files into one output file, with peak memory. Usage: bench/merge_bench.sh BUILD_DIR
 # Size: KG_BENCH_FILES (20) files of KG_BENCH_RECORDS (5000) records, 50 functions of 20
 # blocks each; consecutive files share half of their records.
 set -euo pipefail
@@ -35,7 +35,9 @@ rm -f "$WORK/probe.kgv"
 cat "${inputs[@]}" >/dev/null  # both runs read from the page cache
 
 . "$(dirname "$0")/timing.inc"
-read -r cat_s cat_kb cat_cpu < <(best sh -c 'cat "$@" >/dev/null' sh "${inputs[@]}")
+# cat writes its output as the merge does: the same files in, one file out.
+read -r cat_s cat_kb cat_cpu < <(best sh -c 'out=$1; shift; cat "$@" >"$out"' sh "$WORK/cat.out" "${inputs[@]}")
+rm -f "$WORK/cat.out"
 read -r merge_s merge_kb merge_cpu < <(best "${merge[@]}" "-merge=$WORK/merged.kgv" "${inputs[@]}")
 out_bytes=$(wc -c <"$WORK/merged.kgv")
 
@@ -49,5 +51,5 @@ awk -v b="$bytes" -v cs="$cat_s" -v ms="$merge_s" -v mk="$merge_kb" -v ob="$out_
     printf "  merge: %6.2f s  %8.1f MB/s  (CPU %.2f s)  peak memory %.1f MB\n", ms, mbps(ms), mc, mk * 1024 / 1e6
     ratio = mbps(ms) / mbps(cs)
     mem = mk * 1024 / ob
-    printf "  merge/cat throughput: %.3f (target >= 0.25)  peak memory / output: %.2f (target <= 2)\n", ratio, mem
+    printf "  merge/cat throughput: %.3f (target >= 0.25)  peak memory / output: %.2f (target <= 1.5)\n", ratio, mem
   }'

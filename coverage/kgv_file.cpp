@@ -19,6 +19,8 @@
 namespace {
 
 constexpr size_t kChunk = size_t(1) << 20;
+// How much of a file's records is read at a time.
+constexpr size_t kRecordChunk = size_t(8) << 20;
 
 std::uint32_t bswap32(std::uint32_t v) { return __builtin_bswap32(v); }
 std::uint16_t bswap16(std::uint16_t v) { return __builtin_bswap16(v); }
@@ -236,26 +238,50 @@ ErrorCode readKgvRecords(const std::string& path, KgvReadBuffer* buffer,
   rc = visitor.header(h, sizes);
   if (rc != allOK) return rc;
 
-  // All records in one read: the index gives their total size, and for a regular file no
-  // more than the file holds is asked for. A record beyond what could be read is short.
-  std::uint64_t total = 0;
-  for (std::uint32_t words : sizes) total += std::uint64_t(words) * 4;
-  if (regular) total = std::min<std::uint64_t>(total, st.st_size - indexEnd);
-  rc = readExact(f.get(), total, buf, bytes, got, regular ? static_cast<size_t>(total) : kChunk);
-  if (rc != allOK && ferror(f.get())) return rc;
-  clearPendingSystemError();
-
-  std::uint64_t at = 0;
+  // The records are read a few megabytes at a time and handed over where they lie, so that
+  // memory holds one stretch of the file, never the whole of it beside what is made of it.
+  // For a regular file no more than it holds is asked for; a pipe's data are read as they
+  // come, room growing only with the data.
+  std::uint64_t remaining = 0;
+  for (std::uint32_t words : sizes) remaining += std::uint64_t(words) * 4;
+  if (regular) remaining = std::min<std::uint64_t>(remaining, st.st_size - indexEnd);
+  unsigned char* p = buf.reserve(kRecordChunk);
+  std::size_t capacity = kRecordChunk, start = 0, end = 0;  // unvisited bytes: [start, end)
   for (std::uint32_t i = 0; i < h.recordCount; ++i) {
-    std::uint64_t size = std::uint64_t(sizes[i]) * 4;
+    const std::uint64_t size = std::uint64_t(sizes[i]) * 4;
     if (size == 0) return corruptKgvFile;
-    if (size > got - at) return fileTooShort;
+    while (end - start < size) {
+      if (remaining == 0) return fileTooShort;
+      if (start > 0) {
+        // Records are whole words, so a record moved to the front stays aligned.
+        std::memmove(p, p + start, end - start);
+        end -= start;
+        start = 0;
+      }
+      const std::uint64_t missing = size - (end - start);
+      const std::uint64_t ask = std::min<std::uint64_t>(
+          remaining, regular ? std::max<std::uint64_t>(missing, kRecordChunk) : kRecordChunk);
+      if (end + ask > capacity) {
+        capacity = static_cast<std::size_t>(end + ask);
+        p = buf.reserve(capacity);
+      }
+      const std::size_t got = fread(p + end, 1, static_cast<std::size_t>(ask), f.get());
+      end += got;
+      remaining -= got;
+      if (got < ask) {
+        if (ferror(f.get())) {
+          recordSystemError(errno ? errno : EIO);
+          return fileTooShort;
+        }
+        remaining = 0;  // the file ended before its index said
+      }
+    }
     KgvRecordBytes record;
-    rc = checkRecord(bytes + at, static_cast<size_t>(size), swapped, record);
+    rc = checkRecord(p + start, static_cast<std::size_t>(size), swapped, record);
     if (rc != allOK) return rc;
     rc = visitor.record(record);
     if (rc != allOK) return rc;
-    at += size;
+    start += static_cast<std::size_t>(size);
   }
   return allOK;
 }

@@ -11,14 +11,22 @@
 
 #include "coverage/line_state.h"
 
+// The actual and adjusted class of every line from its flags and count: lines between two
+// relevant lines of one class inside a function take the between class. (The summary does this
+// for every file; an editor of adjustments redoes it for its copy of a file's lines.)
+void classifyLines(std::vector<LineState>& states);
+// The same over lines given one by one (a line may stand for a run of alike lines).
+void classifyLineUnits(std::vector<LineState*>& units);
+
 class LineStates {
  public:
   LineStates() = default;
 
   // Lines 1..lineCount in segments: each of `singles` (1-based; others ignored) alone, the
-  // rest split at every boundary in `boundaries` (the first line of a new segment). All
-  // states cleared.
-  void reset(std::uint32_t lineCount, std::vector<std::uint32_t> singles, std::vector<std::uint32_t> boundaries);
+  // rest split at every boundary in `boundaries` (the first line of a new segment), or
+  // simply a segment per line where the data name most lines. All states cleared; both
+  // vectors may be changed.
+  void reset(std::uint32_t lineCount, std::vector<std::uint32_t>& singles, std::vector<std::uint32_t>& boundaries);
   void clear();
 
   std::uint32_t size() const { return lineCount_; }

@@ -209,69 +209,6 @@ ErrorCode FileCounter::run() {
   return allOK;
 }
 
-// The state of one class pass over a file's lines.
-struct ClassPass {
-  std::size_t previous = 0;  // 1-based position of the previous relevant line; 0 = none
-  std::uint32_t previousClass = 0;
-  bool inFunction = false;
-
-  // The class of the line at position l; lines between two relevant lines of the same class
-  // in a function are filled through `store` (at(k) gives the line at position k).
-  template <typename At, typename Store>
-  std::uint32_t step(At at, std::size_t l, std::uint32_t flags, bool relevant, bool good, Store store) {
-    std::uint32_t cls = ClassNothing;
-    if (flags & LineFuncStart) inFunction = true;
-    if (relevant) {
-      cls = good ? ClassUsed : ClassUnused;
-      if (cls == previousClass && inFunction && previous != 0) {
-        for (std::size_t k = previous + 1; k < l; ++k) store(at(k), good ? ClassBetweenUsed : ClassBetweenUnused);
-      }
-      previous = l;
-      previousClass = cls;
-    }
-    if (flags & LineFuncEnd) {
-      inFunction = false;
-      previous = 0;
-    }
-    return cls;
-  }
-};
-
-// Both passes in one walk: actual (relevant = has code, good = used) and adjusted
-// (relevant = counts for adjusted coverage, good = adjusted used); at(l) is the line at
-// position l (1-based).
-template <typename At>
-void classify(std::size_t count, At at) {
-  ClassPass actual, adjusted;
-  for (std::size_t l = 1; l <= count; ++l) {
-    LineState& s = at(l);
-    std::uint32_t flags = s.flags;
-    bool code = (flags & LineHasCode) != 0;
-    bool used = code && s.count != 0;
-    bool adjRelevant = code, adjGood = used;
-    // Lines without adjustments (nearly all) are decided here; the others by the predicates.
-    if (flags & adjAnyMask) {
-      adjRelevant = lineCountsForAdjusted(flags, s.count);
-      adjGood = lineAdjustedUsed(flags, s.count);
-    }
-    s.actualClass = actual.step(at, l, flags, code, used, [](LineState& t, std::uint32_t c) { t.actualClass = c; });
-    s.adjustedClass =
-        adjusted.step(at, l, flags, adjRelevant, adjGood, [](LineState& t, std::uint32_t c) { t.adjustedClass = c; });
-  }
-}
-
-}  // namespace
-
-void classifyLines(std::vector<LineState>& states) {
-  classify(states.size(), [&](std::size_t l) -> LineState& { return states[l - 1]; });
-}
-
-void classifyLineUnits(std::vector<LineState*>& units) {
-  classify(units.size(), [&](std::size_t l) -> LineState& { return *units[l - 1]; });
-}
-
-namespace {
-
 void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
                      MessageSink& messages, LineStates& states) {
   if (f.lineCount == 0 || !f.record) {
@@ -282,7 +219,10 @@ void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet*
   const std::vector<std::uint16_t>& counts = f.record->counts;
   // Every line the map names stands alone; the adjustments' ranges split the rest, so that
   // each segment has one set of adjustment bits.
-  std::vector<std::uint32_t> singles, boundaries;
+  // Kept from file to file: most files need no new memory for them.
+  thread_local std::vector<std::uint32_t> singles, boundaries;
+  singles.clear();
+  boundaries.clear();
   for (std::uint32_t e : map) {
     const std::uint32_t tag = mapTag(e);
     if (tag == TagFuncLine || tag == TagBlock || tag == TagBlockLine) singles.push_back(mapValue(e));
@@ -294,7 +234,7 @@ void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet*
       return true;
     });
   }
-  states.reset(f.lineCount, std::move(singles), std::move(boundaries));
+  states.reset(f.lineCount, singles, boundaries);
   auto mark = [&](std::uint32_t line, std::uint32_t flag) {
     if (LineState* s = states.single(line)) s->flags |= flag;
   };

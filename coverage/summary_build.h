@@ -30,13 +30,6 @@ std::uint32_t hitsPolicyFromText(const char* value);
 // functions are reported (the first of each file, as a notice) while line states are made.
 bool corruptedLinesReported();
 
-// The actual and adjusted class of every line from its flags and count: lines between two
-// relevant lines of one class inside a function take the between class. (The summary does this
-// for every file; an editor of adjustments redoes it for its copy of a file's lines.)
-void classifyLines(std::vector<LineState>& states);
-// The same over lines given one by one (a line may stand for a run of alike lines).
-void classifyLineUnits(std::vector<LineState*>& units);
-
 // Builds the whole tree and sorts it. The data's maps may be reordered in place where a
 // function's blocks are out of line order. On failure nothing is handed back. Without line
 // states (a report that reads each file once) they are made per file by LazyLineStates.

@@ -3,9 +3,11 @@
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <sys/resource.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstring>
 
 #include "tests/coverage/kgv_test_util.h"
@@ -217,5 +219,52 @@ TEST(DataFiles, AWriteThatFailsLeavesThePreviousFileIntact) {
 
   // A target in a directory that does not exist cannot be created.
   EXPECT_EQ(writeKgvFile(dir.file("no/such/dir.kgv"), *big), writeError);
+  clearPendingSystemError();
+}
+
+TEST(DataFiles, ALargeFileReadsTheSameFromDiskAndFromAPipeAcrossItsReadStretches) {
+  TempDir dir;
+  // Larger than the stretch the reader takes at a time, records straddling its ends.
+  const std::string path =
+      makeKgv(dir, "big.kgv", "generate records=1500 functions=50 blocks=20 seed=3 hits=1\n");
+  const std::string bytes = readFile(path);
+  ASSERT_GT(bytes.size(), size_t(10) << 20);
+  auto fromDisk = readOk(path);
+  ASSERT_TRUE(fromDisk);
+  ASSERT_EQ(fromDisk->records.size(), 1500u);
+  // Written back, it is the same file but for the save time.
+  ASSERT_EQ(writeKgvFile(dir.file("copy.kgv"), *fromDisk), allOK);
+  const std::string copy = readFile(dir.file("copy.kgv"));
+  ASSERT_EQ(copy.size(), bytes.size());
+  EXPECT_TRUE(copy.compare(0, 20, bytes, 0, 20) == 0 && copy.compare(24, std::string::npos, bytes, 24) == 0);
+
+  const std::string fifo = dir.file("pipe.kgv");
+  ASSERT_EQ(mkfifo(fifo.c_str(), 0600), 0);
+  pid_t writer = fork();
+  ASSERT_GE(writer, 0);
+  if (writer == 0) {
+    // Small writes, so the reader sees the data arrive in pieces.
+    FILE* out = fopen(fifo.c_str(), "wb");
+    for (size_t at = 0; out && at < bytes.size(); at += 4093)
+      fwrite(bytes.data() + at, 1, std::min<size_t>(4093, bytes.size() - at), out);
+    _exit(out && fclose(out) == 0 ? 0 : 1);
+  }
+  std::unique_ptr<KgvData> fromPipe;
+  EXPECT_EQ(readKgvFile(fifo, fromPipe), allOK);
+  int status = 0;
+  waitpid(writer, &status, 0);
+  ASSERT_TRUE(fromPipe);
+  ASSERT_EQ(fromPipe->records.size(), fromDisk->records.size());
+  for (size_t i = 0; i < fromDisk->records.size(); ++i) {
+    const ObjRecord &a = *fromDisk->records[i], &b = *fromPipe->records[i];
+    ASSERT_EQ(a.map, b.map) << i;
+    ASSERT_EQ(a.counts, b.counts) << i;
+    ASSERT_EQ(std::string(a.fileName()), std::string(b.fileName())) << i;
+  }
+  // Cut anywhere near the stretches' ends, the file is short, never misread.
+  for (size_t cut : {size_t(8) << 20, (size_t(8) << 20) + 5, (size_t(8) << 20) - 4, bytes.size() - 1}) {
+    writeFile(dir.file("cut.kgv"), bytes.substr(0, cut));
+    EXPECT_EQ(readCode(dir.file("cut.kgv")), fileTooShort) << cut;
+  }
   clearPendingSystemError();
 }
