@@ -463,6 +463,7 @@ ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPo
     }
   }
 
+  root->lineStatesKept = withLineStates;
   rc = computeStatistics(*root, hitsPolicy, AdjustIndex(adjustments), messages, withLineStates);
   if (rc != allOK) return rc;
   sortSummary(*root, sortOrder);
@@ -491,7 +492,7 @@ ErrorCode recomputeSummary(SumRoot& root, std::uint32_t hitsPolicy,
                            const AdjustmentList& adjustments, MessageSink& messages) {
   root.hitsPolicy = hitsPolicy;
   try {
-    return computeStatistics(root, hitsPolicy, AdjustIndex(adjustments), messages, true);
+    return computeStatistics(root, hitsPolicy, AdjustIndex(adjustments), messages, root.lineStatesKept);
   } catch (const std::bad_alloc&) {
     return outOfMemory;
   } catch (...) {

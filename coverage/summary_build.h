@@ -29,17 +29,21 @@ std::uint32_t hitsPolicyFromText(const char* value);
 // PROCESS_CORRUPTED_LINES, read once: whether block lines past the last line of a file's
 // functions are reported (the first of each file, as a notice) while line states are made.
 bool corruptedLinesReported();
+// Whether a summary makes every file's line states with its counts: only when damaged line
+// numbers are to be reported, which they are as line states are made. Otherwise memory
+// holds line states only for the file being shown or written.
+inline bool lineStatesUpFront() { return corruptedLinesReported(); }
 
 // Builds the whole tree and sorts it. The data's maps may be reordered in place where a
 // function's blocks are out of line order. On failure nothing is handed back. Without line
-// states (a report that reads each file once) they are made per file by LazyLineStates.
-// Notices about damaged line numbers go to `messages`.
+// states (a report that reads each file once, a window that shows one file at a time) they
+// are made per file by LazyLineStates. Notices about damaged line numbers go to `messages`.
 ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
                        const AdjustmentList& adjustments, MessageSink& messages,
                        std::unique_ptr<SumRoot>& out, bool withLineStates = true);
 
-// Counts and line states again over an existing tree (after the adjustments changed); the
-// records, names and order stay.
+// Counts again over an existing tree (after the adjustments changed), and line states where
+// the tree keeps them; the records, names and order stay.
 ErrorCode recomputeSummary(SumRoot& root, std::uint32_t hitsPolicy,
                            const AdjustmentList& adjustments, MessageSink& messages);
 

@@ -102,6 +102,9 @@ struct SumRoot {
   std::vector<char> dirNames;
   std::uint32_t sortOrder = 1;
   std::uint32_t hitsPolicy = 1;
+  // Whether every file's line states were made with the counts (else they are made when
+  // a file is shown, see LazyLineStates); a recount does as the build did.
+  bool lineStatesKept = true;
 };
 
 // Directory name used for paths without "/".

@@ -373,7 +373,8 @@ ErrorCode KG_FileDetail::load(SumFile& file, std::uint32_t line) {
       recountSummary(outline_);
     }
   }
-  model_->takeLineStates(file);
+  KG_SummaryOverall* all = outline_ ? outline_->overall() : nullptr;
+  model_->takeLineStates(file, all ? all->summary().hitsPolicy : getHitsPolicy());
   refreshTitle();
   source_->measure();
   counts_->measure();

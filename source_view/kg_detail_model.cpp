@@ -140,12 +140,17 @@ LoadedSourceAdjustments KG_DetailModel::rescanMarkers(const std::string& dirName
   return applyLoadedSourceMarkers(dirName + fileName, text_, adjustmentList(), adjustmentTimeNow());
 }
 
-void KG_DetailModel::takeLineStates(const SumFile& file) {
+void KG_DetailModel::takeLineStates(const SumFile& file, std::uint32_t hitsPolicy) {
+  // A tree that keeps no line states has them made here for this file. Notices of damaged
+  // line numbers are not wanted now: when they are, every file's states were made up front.
+  MessageList notices;
+  LazyLineStates lazy(adjustmentList(), hitsPolicy, notices);
+  const LineStates& lines = lazy.of(file);
   // The text's lines, and those the data has beyond a source that shrank since; but a line
   // number far past the text's end costs no memory here.
   const auto textLines = static_cast<std::uint32_t>(std::min<std::size_t>(text_.lineCount(), 0x0FFFFFFF));
-  const std::uint32_t beyond = std::min<std::uint32_t>(file.lineStates.size(), textLines + 100000);
-  states_ = file.lineStates.dense(std::max<std::uint32_t>({1, textLines, beyond}));
+  const std::uint32_t beyond = std::min<std::uint32_t>(lines.size(), textLines + 100000);
+  states_ = lines.dense(std::max<std::uint32_t>({1, textLines, beyond}));
   fileName_ = file.name;
   dirName_ = file.dir != nullptr ? file.dir->name : "";
   // The summary's lines carry the adjustments of when it was counted; edits not saved since

@@ -79,7 +79,7 @@ class KG_DetailModel {
   // summary path; the caller writes the file and recomputes when the list changed.
   LoadedSourceAdjustments rescanMarkers(const std::string& dirName, const std::string& fileName);
   // Takes a copy of the file's line states and its names.
-  void takeLineStates(const SumFile& file);
+  void takeLineStates(const SumFile& file, std::uint32_t hitsPolicy);
 
   // ---- what the panes show (indices are 0-based lines)
   // Text lines: at least one, an empty text shows one blank line.

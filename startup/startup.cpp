@@ -293,9 +293,9 @@ ErrorCode prepareStartupSummary(StartupState& s, StartupSummary& out) {
   out.hitsPolicy = getHitsPolicy();
 
   // 15. The summary.
-  // The report alone reads each file's line states once: they are made as it goes, except
-  // when damaged line numbers are to be reported before anything else.
-  bool lineStatesLater = s.mode == RunMode::exportReport && !corruptedLinesReported();
+  // The report reads each file's line states once and the window shows one file at a time:
+  // they are made when needed, except when damaged line numbers are to be reported first.
+  bool lineStatesLater = (s.mode == RunMode::exportReport || s.mode == RunMode::view) && !lineStatesUpFront();
   ConsoleMessages console(s.mode != RunMode::view);
   rc = buildSummary(*out.data, out.sortOrder, out.hitsPolicy, adjustmentList(), console, out.summary,
                     !lineStatesLater);

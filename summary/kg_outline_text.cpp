@@ -369,7 +369,8 @@ ErrorCode KG_SummaryOverall::replace_data(std::unique_ptr<KgvData> data, Message
   if (!data) return allOK;
   std::unique_ptr<SumRoot> fresh;
   ErrorCode rc =
-      buildSummary(*data, summary_->sortOrder, summary_->hitsPolicy, adjustmentList(), messages, fresh);
+      buildSummary(*data, summary_->sortOrder, summary_->hitsPolicy, adjustmentList(), messages, fresh,
+                   summary_->lineStatesKept);
   if (rc != allOK || !fresh) {
     if (hooks.showError) hooks.showError(kgMessageText("sortCombinedData", "Unable to sort combined data"), rc);
     return rc == allOK ? corruptKgvFile : rc;

@@ -557,6 +557,25 @@ TEST(SummaryTree, DamagedMapsGiveCorruptDataOrATreeButNeverACrash) {
       // And the report is written from either tree, the second making line states as it goes.
       std::unique_ptr<SumRoot> lazy;
       ASSERT_EQ(buildSummary(data, 1, hitsMax, adj, gMessages, lazy, false), allOK);
+      // Made on request, a file's line states are those the full build keeps, and a recount
+      // of the tree that keeps none makes none.
+      LazyLineStates onRequest(adj, hitsMax, gMessages);
+      for (std::size_t d = 0; d < again->dirRecords.size(); ++d)
+        for (std::size_t k = 0; k < again->dirRecords[d].fileRecords.size(); ++k) {
+          const SumFile& kept = again->dirRecords[d].fileRecords[k];
+          const SumFile& made = lazy->dirRecords[d].fileRecords[k];
+          if (kept.lineStates.size() > (1u << 20)) continue;
+          const std::vector<LineState> a = kept.lineStates.dense(kept.lineStates.size());
+          const std::vector<LineState> b = onRequest.of(made).dense(kept.lineStates.size());
+          ASSERT_EQ(a.size(), b.size()) << kept.name;
+          for (std::size_t i = 0; i < a.size(); ++i)
+            ASSERT_TRUE(a[i].flags == b[i].flags && a[i].count == b[i].count && a[i].actualClass == b[i].actualClass &&
+                        a[i].adjustedClass == b[i].adjustedClass)
+                << kept.name << " line " << i + 1;
+        }
+      ASSERT_EQ(recomputeSummary(*lazy, hitsMax, adj, gMessages), allOK);
+      for (const SumDir& d : lazy->dirRecords)
+        for (const SumFile& f : d.fileRecords) ASSERT_TRUE(f.lineStates.empty());
       FILE* sink = fopen("/dev/null", "w");
       ASSERT_NE(sink, nullptr);
       EXPECT_EQ(writeExport(sink, *again, gMessages), allOK);

@@ -76,7 +76,7 @@ class DetailModel : public ::testing::Test {
     if (found.listChanged) {
       EXPECT_EQ(recomputeSummary(*root, hitsMax, adjustmentList(), messages), allOK);
     }
-    m->takeLineStates(*file);
+    m->takeLineStates(*file, root->hitsPolicy);
     return m;
   }
 
