@@ -14,24 +14,47 @@
 #include <cstdlib>
 #include <cstring>
 #include <string_view>
+#include <type_traits>
 
-ImportedFunction& ImportedFile::function(const std::string& key) {
-  auto it = functionIndex.find(key);
-  if (it != functionIndex.end()) return functions[it->second];
-  functionIndex.emplace(key, functions.size());
-  functions.push_back(ImportedFunction{key, key, 0, 0, 0});
+static_assert(std::is_nothrow_move_constructible_v<ImportedFile>,
+              "the files' vector must move its files as it grows, not copy them");
+
+namespace {
+// Functions a file may have before it keeps an index of them.
+constexpr size_t kIndexedFunctions = 16;
+}  // namespace
+
+ImportedFunction& ImportedFile::function(std::string_view key) {
+  if (functionIndex.empty()) {
+    for (ImportedFunction& f : functions)
+      if (f.key == key) return f;
+  } else {
+    auto it = functionIndex.find(key);
+    if (it != functionIndex.end()) return functions[it->second];
+  }
+  functions.push_back(ImportedFunction{std::string(key), std::string(key), 0, 0, 0});
+  if (!functionIndex.empty()) functionIndex.emplace(functions.back().key, functions.size() - 1);
+  else if (functions.size() >= kIndexedFunctions) reindexFunctions();
   namesDue = true;
   return functions.back();
 }
 
-void ImportedFile::addLine(std::uint32_t line, std::uint64_t hits) {
-  auto [it, inserted] = lines.emplace(line, hits);
-  if (!inserted) it->second = addCounts(it->second, hits);
+void ImportedFile::reindexFunctions() {
+  functionIndex.clear();
+  if (functions.size() < kIndexedFunctions) return;
+  functionIndex.reserve(functions.size());
+  for (size_t i = 0; i < functions.size(); ++i) functionIndex.emplace(functions[i].key, i);
 }
 
 void ImportedFile::addBranch(std::uint32_t line, const BranchKey& key, std::uint64_t taken) {
-  auto [it, inserted] = branches[line].emplace(key, taken);
-  if (!inserted) it->second = addCounts(it->second, taken);
+  std::uint64_t& t = branches.slot(line).slot(key);
+  t = addCounts(t, taken);
+}
+
+void ImportedFile::settle() {
+  lines.settle();
+  branches.settle();
+  for (auto& [line, outcomes] : branches) outcomes.settle();
 }
 
 namespace {
@@ -70,7 +93,43 @@ std::string variantOf(const std::string& key, const std::string& other) {
   return key;
 }
 
+// As nameFileFunctions below, by comparing each function with the others: for the few
+// functions most files have, quicker than building the maps.
+void nameFewFunctions(ImportedFile& file) {
+  std::vector<ImportedFunction>& fs = file.functions;
+  const size_t n = fs.size();
+  std::vector<std::string> base;
+  base.reserve(n);
+  for (const ImportedFunction& f : fs) base.push_back(demangledName(f.key));
+  for (size_t i = 0; i < n; ++i) {
+    ImportedFunction& f = fs[i];
+    // The first other function of the same shown name, if any.
+    size_t other = n;
+    for (size_t j = 0; j < n && other == n; ++j)
+      if (j != i && base[j] == base[i]) other = j;
+    if (other == n || f.key == base[i]) {
+      f.name = base[i];
+      continue;
+    }
+    f.name = base[i] + " [" + variantOf(f.key, fs[other].key) + "]";
+  }
+  auto takenBefore = [&](size_t i, const std::string& name) {
+    for (size_t j = 0; j < i; ++j)
+      if (fs[j].name == name) return true;
+    return false;
+  };
+  for (size_t i = 0; i < n; ++i) {
+    ImportedFunction& f = fs[i];
+    if (!takenBefore(i, f.name)) continue;
+    std::string candidate = base[i] + " [" + f.key + "]";
+    for (unsigned k = 2; takenBefore(i, candidate); ++k) candidate = base[i] + " [" + f.key + "] #" + std::to_string(k);
+    f.name = candidate;
+  }
+  file.namesDue = false;
+}
+
 void nameFileFunctions(ImportedFile& file) {
+  if (file.functions.size() <= 32) return nameFewFunctions(file);
   std::vector<std::string> base;
   base.reserve(file.functions.size());
   std::unordered_map<std::string, std::vector<size_t>> byBase;
@@ -125,12 +184,12 @@ std::string demangledName(const std::string& key) {
   return shown;
 }
 
-ImportedFile& ImportedData::file(const std::string& path) {
+ImportedFile& ImportedData::file(std::string path) {
   auto it = fileIndex.find(path);
   if (it != fileIndex.end()) return files[it->second];
-  fileIndex.emplace(path, files.size());
   files.emplace_back();
   files.back().path = path;
+  fileIndex.emplace(std::move(path), files.size() - 1);
   return files.back();
 }
 
@@ -151,21 +210,47 @@ void addImportedData(ImportedData& into, const ImportedData& from) {
     for (const auto& [line, hits] : src.lines) dst.addLine(line, hits);
     for (const auto& [line, outcomes] : src.branches)
       for (const auto& [key, taken] : outcomes) dst.addBranch(line, key, taken);
+    dst.settle();
     dst.runs = addCounts(dst.runs, src.runs);
     dst.fromGcov = dst.fromGcov || src.fromGcov;
   }
   into.nameFunctions();
 }
 
+namespace {
+
+// An absolute path that normalising leaves as it is: no empty, "." or ".." part.
+bool alreadyNormal(std::string_view p) {
+  if (p.empty() || p[0] != '/') return false;
+  if (p.size() == 1) return true;
+  for (size_t i = 1; i <= p.size();) {
+    size_t slash = p.find('/', i);
+    if (slash == std::string_view::npos) slash = p.size();
+    size_t len = slash - i;
+    if (len == 0 || (p[i] == '.' && (len == 1 || (len == 2 && p[i + 1] == '.')))) return false;
+    i = slash + 1;
+  }
+  return true;
+}
+
+}  // namespace
+
+std::string sourceBaseDirectory(const std::string& base) {
+  std::string dir = base;
+  if (dir.empty() || dir[0] != '/') {
+    char cwd[PATH_MAX];
+    if (getcwd(cwd, sizeof cwd) && cwd[0] == '/')
+      dir = dir.empty() ? std::string(cwd) : std::string(cwd) + "/" + dir;
+  }
+  return dir;
+}
+
 std::string normalisedSourcePath(const std::string& path, const std::string& base) {
+  // Most inputs name their sources this way already.
+  if (alreadyNormal(path)) return path;
   std::string full = path;
   if (full.empty() || full[0] != '/') {
-    std::string dir = base;
-    if (dir.empty() || dir[0] != '/') {
-      char cwd[PATH_MAX];
-      if (getcwd(cwd, sizeof cwd) && cwd[0] == '/')
-        dir = dir.empty() ? std::string(cwd) : std::string(cwd) + "/" + dir;
-    }
+    std::string dir = sourceBaseDirectory(base);
     // Without a usable working directory a relative path stays relative.
     if (!dir.empty() && dir[0] == '/') full = dir + "/" + full;
   }

@@ -3,10 +3,13 @@
 // and the taken count of every branch outcome.
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
-#include <map>
+#include <stdexcept>
 #include <string>
+#include <string_view>
 #include <unordered_map>
+#include <utility>
 #include <vector>
 
 struct ImportedFunction {
@@ -29,34 +32,190 @@ struct BranchOrder {
   bool operator()(const BranchKey& a, const BranchKey& b) const;
 };
 
-using LineBranches = std::map<BranchKey, std::uint64_t, BranchOrder>;
+// Saturating addition for counts kept in 64 bits.
+inline std::uint64_t addCounts(std::uint64_t a, std::uint64_t b) {
+  return a > UINT64_MAX - b ? UINT64_MAX : a + b;
+}
+
+// A map kept as one vector in key order: inputs list their lines mostly in ascending order,
+// which appends, and a tree's node per line cost more than the reading. A key that comes
+// out of order and is not there yet waits at the end until the next read of the map (or
+// settle()); waiting entries of one key are then combined by Combine, in any order.
+template <class K, class V, class Less, class Combine>
+class SortedMap {
+ public:
+  using value_type = std::pair<K, V>;
+  using iterator = typename std::vector<value_type>::iterator;
+  using const_iterator = typename std::vector<value_type>::const_iterator;
+
+  SortedMap() = default;
+  SortedMap(const SortedMap&) = default;
+  SortedMap& operator=(const SortedMap&) = default;
+  // What is moved from is left empty, its count of entries in order with it.
+  SortedMap(SortedMap&& o) noexcept : items_(std::move(o.items_)), sorted_(o.sorted_) { o.clear(); }
+  SortedMap& operator=(SortedMap&& o) noexcept {
+    if (this == &o) return *this;
+    items_ = std::move(o.items_);
+    sorted_ = o.sorted_;
+    o.clear();
+    return *this;
+  }
+
+  // The value of `key`, value-initialised when it is new.
+  V& slot(const K& key) {
+    if (sorted_ == items_.size()) {
+      if (items_.empty() || Less()(items_.back().first, key)) {
+        items_.emplace_back(key, V());
+        ++sorted_;
+        return items_.back().second;
+      }
+      if (!Less()(key, items_.back().first)) return items_.back().second;
+    }
+    auto end = items_.begin() + static_cast<std::ptrdiff_t>(sorted_);
+    auto it = std::lower_bound(items_.begin(), end, key, KeyLess());
+    if (it != end && !Less()(key, it->first)) return it->second;
+    items_.emplace_back(key, V());
+    return items_.back().second;
+  }
+
+  // Puts the waiting entries in place; reads do it themselves.
+  void settle() const {
+    if (sorted_ == items_.size()) return;
+    auto mid = items_.begin() + static_cast<std::ptrdiff_t>(sorted_);
+    std::sort(mid, items_.end(), KeyLess());
+    std::inplace_merge(items_.begin(), mid, items_.end(), KeyLess());
+    auto out = items_.begin();
+    for (auto it = items_.begin() + 1; it != items_.end(); ++it) {
+      if (Less()(out->first, it->first)) {
+        if (++out != it) *out = std::move(*it);  // strings moved onto themselves empty
+      } else Combine()(out->second, std::move(it->second));
+    }
+    items_.erase(out + 1, items_.end());
+    sorted_ = items_.size();
+  }
+
+  iterator begin() { settle(); return items_.begin(); }
+  iterator end() { settle(); return items_.end(); }
+  const_iterator begin() const { settle(); return items_.begin(); }
+  const_iterator end() const { settle(); return items_.end(); }
+  size_t size() const { settle(); return items_.size(); }
+  bool empty() const { return items_.empty(); }
+  void clear() { items_.clear(); sorted_ = 0; }
+  void reserve(size_t n) { items_.reserve(n); }
+
+  iterator find(const K& key) {
+    settle();
+    auto it = std::lower_bound(items_.begin(), items_.end(), key, KeyLess());
+    return it != items_.end() && !Less()(key, it->first) ? it : items_.end();
+  }
+  const_iterator find(const K& key) const {
+    settle();
+    auto it = std::lower_bound(items_.cbegin(), items_.cend(), key, KeyLess());
+    return it != items_.cend() && !Less()(key, it->first) ? it : items_.cend();
+  }
+  size_t count(const K& key) const { return find(key) != end() ? 1 : 0; }
+  V& at(const K& key) {
+    auto it = find(key);
+    if (it == items_.end()) throw std::out_of_range("SortedMap::at");
+    return it->second;
+  }
+  const V& at(const K& key) const {
+    auto it = find(key);
+    if (it == items_.cend()) throw std::out_of_range("SortedMap::at");
+    return it->second;
+  }
+  V& operator[](const K& key) {
+    settle();
+    auto it = std::lower_bound(items_.begin(), items_.end(), key, KeyLess());
+    if (it == items_.end() || Less()(key, it->first)) it = items_.emplace(it, key, V());
+    sorted_ = items_.size();
+    return it->second;
+  }
+  size_t erase(const K& key) {
+    auto it = find(key);
+    if (it == items_.end()) return 0;
+    items_.erase(it);
+    sorted_ = items_.size();
+    return 1;
+  }
+  // Drops every entry whose key `pred` holds, in one pass.
+  template <class Pred>
+  void eraseKeys(Pred pred) {
+    settle();
+    items_.erase(std::remove_if(items_.begin(), items_.end(), [&](const value_type& e) { return pred(e.first); }),
+                 items_.end());
+    sorted_ = items_.size();
+  }
+
+ private:
+  struct KeyLess {
+    bool operator()(const value_type& a, const value_type& b) const { return Less()(a.first, b.first); }
+    bool operator()(const value_type& a, const K& b) const { return Less()(a.first, b); }
+  };
+  // Reads settle the waiting entries, so these change under const.
+  mutable std::vector<value_type> items_;
+  mutable size_t sorted_ = 0;  // entries in order, each key once; the rest wait
+};
+
+struct AddCountsInto {
+  void operator()(std::uint64_t& into, std::uint64_t from) const { into = addCounts(into, from); }
+};
+
+using LineBranches = SortedMap<BranchKey, std::uint64_t, BranchOrder, AddCountsInto>;
+
+struct MergeLineBranches {
+  void operator()(LineBranches& into, LineBranches&& from) const {
+    for (auto& [key, taken] : from) {
+      std::uint64_t& t = into.slot(key);
+      t = addCounts(t, taken);
+    }
+  }
+};
+
+// Hash of std::string that also takes a string_view, so that lookups build no string.
+struct StringViewHash {
+  using is_transparent = void;
+  size_t operator()(std::string_view s) const { return std::hash<std::string_view>()(s); }
+};
+
+using NameIndex = std::unordered_map<std::string, size_t, StringViewHash, std::equal_to<>>;
 
 struct ImportedFile {
   std::string path;
-  std::vector<ImportedFunction> functions;                // in order of first appearance
-  std::unordered_map<std::string, size_t> functionIndex;  // by key
-  std::map<std::uint32_t, std::uint64_t> lines;           // line -> hits
-  std::map<std::uint32_t, LineBranches> branches;         // line -> outcome -> times taken
-  std::uint64_t runs = 0;                                 // 0 when the input does not say
-  bool namesDue = false;                                  // functions added since naming
+  std::vector<ImportedFunction> functions;  // in order of first appearance
+  // By key; kept only once a file has many functions, as a scan is quicker for a few.
+  NameIndex functionIndex;
+  SortedMap<std::uint32_t, std::uint64_t, std::less<std::uint32_t>, AddCountsInto> lines;  // line -> hits
+  SortedMap<std::uint32_t, LineBranches, std::less<std::uint32_t>, MergeLineBranches>
+      branches;            // line -> outcome -> times taken
+  std::uint64_t runs = 0;  // 0 when the input does not say
+  bool namesDue = false;   // functions added since naming
   // Read from gcov, whose data lcov filters by the exclusion markers in the source; lcov's
   // tracefiles come filtered.
   bool fromGcov = false;
 
   // The function of that key, added when new.
-  ImportedFunction& function(const std::string& key);
-  void addLine(std::uint32_t line, std::uint64_t hits);
+  ImportedFunction& function(std::string_view key);
+  void addLine(std::uint32_t line, std::uint64_t hits) {
+    std::uint64_t& h = lines.slot(line);
+    h = addCounts(h, hits);
+  }
   void addBranch(std::uint32_t line, const BranchKey& key, std::uint64_t taken);
+  // Puts lines and branches that came out of order in place; the readers call it when a
+  // record is complete, so that later reads change nothing.
+  void settle();
+  // After functions were taken out.
+  void reindexFunctions();
 };
 
 struct ImportedData {
   std::vector<ImportedFile> files;  // in order of first appearance
-  std::unordered_map<std::string, size_t> fileIndex;
+  NameIndex fileIndex;
   // Where relative source paths of tracefiles (and of gcov JSON that names no working
   // directory) are taken from; empty: the current directory.
   std::string baseDirectory;
 
-  ImportedFile& file(const std::string& path);
+  ImportedFile& file(std::string path);
   // Gives the functions added since the last call their shown names; the readers call it
   // when they have read an input.
   void nameFunctions();
@@ -79,6 +238,9 @@ std::string demangledName(const std::string& key);
 // The absolute, lexically normalised form of a source path ("." and ".." resolved, no
 // doubled "/"); a relative path is taken from `base` (itself made absolute first).
 std::string normalisedSourcePath(const std::string& path, const std::string& base);
+// The directory normalisedSourcePath takes relative paths from, for `base`: readers work it
+// out once for all the paths of an input.
+std::string sourceBaseDirectory(const std::string& base);
 
 // Where and why an input could not be read.
 struct ImportError {
@@ -101,8 +263,3 @@ bool readLcovTracefile(const std::string& name, const std::string& text, Importe
                        ImportError& error);
 bool readGcovJson(const std::string& name, const std::string& text, ImportedData& data,
                   ImportError& error);
-
-// Saturating addition for counts kept in 64 bits.
-inline std::uint64_t addCounts(std::uint64_t a, std::uint64_t b) {
-  return a > UINT64_MAX - b ? UINT64_MAX : a + b;
-}

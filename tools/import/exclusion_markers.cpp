@@ -42,16 +42,14 @@ Exclusions scan(std::istream& in) {
 }
 
 void apply(ImportedFile& file, const Exclusions& e) {
-  for (std::uint32_t l : e.lines) {
-    file.lines.erase(l);
-    file.branches.erase(l);
-  }
-  for (std::uint32_t l : e.branches) file.branches.erase(l);
+  // One pass over each map: a section may mark many lines.
+  if (!e.lines.empty()) file.lines.eraseKeys([&](std::uint32_t l) { return e.lines.count(l) != 0; });
+  if (!e.lines.empty() || !e.branches.empty())
+    file.branches.eraseKeys([&](std::uint32_t l) { return e.lines.count(l) != 0 || e.branches.count(l) != 0; });
   auto excluded = [&](const ImportedFunction& f) { return e.lines.count(f.startLine) != 0; };
   if (std::none_of(file.functions.begin(), file.functions.end(), excluded)) return;
   file.functions.erase(std::remove_if(file.functions.begin(), file.functions.end(), excluded), file.functions.end());
-  file.functionIndex.clear();
-  for (size_t i = 0; i < file.functions.size(); ++i) file.functionIndex.emplace(file.functions[i].key, i);
+  file.reindexFunctions();
   file.namesDue = true;  // a name that met a left-out one may stand alone now
 }
 

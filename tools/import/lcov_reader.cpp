@@ -16,6 +16,15 @@ struct Parser {
   ImportedFile* current = nullptr;
   // FNL/FNA (lcov 2.2 and later) refer to functions by an index within the record.
   std::unordered_map<std::uint64_t, std::pair<std::uint32_t, std::uint32_t>> ranges;
+  // Where relative source paths are taken from, worked out at the first one.
+  std::string base;
+  bool baseKnown = false;
+
+  // The record read so far is complete: its out-of-order lines go in place.
+  void endRecord() {
+    if (current) current->settle();
+    current = nullptr;
+  }
 
   bool fail(const std::string& message) {
     error.file = name;
@@ -66,15 +75,22 @@ struct Parser {
     return true;
   }
 
-  static std::vector<std::string_view> split(std::string_view s, size_t maxParts) {
-    std::vector<std::string_view> parts;
-    while (parts.size() + 1 < maxParts) {
+  // Up to three comma-separated fields, the last taking the rest.
+  struct Fields {
+    std::string_view part[3];
+    size_t count = 0;
+    size_t size() const { return count; }
+    std::string_view operator[](size_t i) const { return part[i]; }
+  };
+  static Fields split(std::string_view s, size_t maxParts) {
+    Fields parts;
+    while (parts.count + 1 < maxParts) {
       size_t comma = s.find(',');
       if (comma == std::string_view::npos) break;
-      parts.push_back(s.substr(0, comma));
+      parts.part[parts.count++] = s.substr(0, comma);
       s.remove_prefix(comma + 1);
     }
-    parts.push_back(s);
+    parts.part[parts.count++] = s;
     return parts;
   }
 
@@ -88,7 +104,7 @@ struct Parser {
     if (text.empty()) return true;
     if (text == "end_of_record") {
       if (!current) return fail("end_of_record without a record");
-      current = nullptr;
+      endRecord();
       ranges.clear();
       return true;
     }
@@ -99,16 +115,24 @@ struct Parser {
 
     if (key == "SF") {
       if (value.empty()) return fail("SF without a file name");
-      current = &data.file(normalisedSourcePath(std::string(value), data.baseDirectory));
+      endRecord();
+      std::string path(value);
+      if (path[0] != '/' && !baseKnown) {
+        base = sourceBaseDirectory(data.baseDirectory);
+        baseKnown = true;
+      }
+      current = &data.file(normalisedSourcePath(path, path[0] == '/' ? data.baseDirectory : base));
       ranges.clear();
       return true;
     }
     if (key == "DA") {
       if (!needRecord(key)) return false;
-      auto p = split(value, 3);  // line,count[,checksum]
+      // line,count[,checksum]
+      size_t c1 = value.find(',');
       std::uint32_t ln;
       std::uint64_t hits;
-      if (p.size() < 2 || !lineNumber(p[0], ln) || ln == 0 || !count(p[1], hits))
+      if (c1 == std::string_view::npos || !lineNumber(value.substr(0, c1), ln) || ln == 0 ||
+          !count(value.substr(c1 + 1, value.find(',', c1 + 1) - (c1 + 1)), hits))
         return fail("malformed DA record '" + std::string(value) + "'");
       current->addLine(ln, hits);
       return true;
@@ -120,12 +144,12 @@ struct Parser {
       auto p = split(value, 3);
       std::uint32_t start = 0, end = 0;
       if (p.size() < 2 || !lineNumber(p[0], start)) return fail("malformed FN record '" + std::string(value) + "'");
-      std::string fname;
+      std::string_view fname;
       if (p.size() == 3 && lineNumber(p[1], end)) {
-        fname = std::string(p[2]);
+        fname = p[2];
       } else {
         end = 0;
-        fname = std::string(value.substr(p[0].size() + 1));
+        fname = value.substr(p[0].size() + 1);
       }
       if (fname.empty()) return fail("FN record without a function name");
       ImportedFunction& f = current->function(fname);
@@ -139,7 +163,7 @@ struct Parser {
       std::uint64_t calls;
       if (comma == std::string_view::npos || !count(value.substr(0, comma), calls) || comma + 1 == value.size())
         return fail("malformed FNDA record '" + std::string(value) + "'");
-      ImportedFunction& f = current->function(std::string(value.substr(comma + 1)));
+      ImportedFunction& f = current->function(value.substr(comma + 1));
       f.calls = addCounts(f.calls, calls);
       return true;
     }
@@ -162,7 +186,7 @@ struct Parser {
         return fail("malformed FNA record '" + std::string(value) + "'");
       auto r = ranges.find(index);
       if (r == ranges.end()) return fail("FNA record for function index " + std::to_string(index) + " without FNL");
-      ImportedFunction& f = current->function(std::string(p[2]));
+      ImportedFunction& f = current->function(p[2]);
       if (f.startLine == 0) f.startLine = r->second.first;
       if (f.endLine == 0) f.endLine = r->second.second;
       f.calls = addCounts(f.calls, calls);
@@ -197,15 +221,17 @@ struct Parser {
 
 bool readLcovTracefile(const std::string& name, const std::string& text, ImportedData& data,
                        ImportError& error) {
-  Parser p{name, data, error, 0, nullptr, {}};
+  Parser p{name, data, error, 0, nullptr, {}, {}, false};
   size_t pos = 0;
   bool ok = true;
+  // Lines before the first NUL need no look for one.
+  const size_t firstNul = text.find('\0');
   while (ok && pos < text.size()) {
     size_t nl = text.find('\n', pos);
     size_t end = nl == std::string::npos ? text.size() : nl;
     ++p.lineNo;
     std::string_view line(text.data() + pos, end - pos);
-    if (line.find('\0') != std::string_view::npos) {
+    if (firstNul != std::string::npos && firstNul < end) {
       ok = p.fail("binary data in a tracefile");
     } else if (!p.line(line)) {
       // A last line without its newline that does not read is most likely cut short.
@@ -216,6 +242,7 @@ bool readLcovTracefile(const std::string& name, const std::string& text, Importe
     }
     pos = end + 1;
   }
+  if (p.current) p.current->settle();
   if (ok && p.current) {
     ++p.lineNo;
     ok = p.fail("the tracefile looks truncated: its last record has no end_of_record");

@@ -68,6 +68,9 @@ LaidOutRecord layOutRecord(const ImportedFile& file) {
   std::vector<LaidOutLine> fileScope;
   std::vector<const Range*> open;
   size_t next = 0;
+  // Branches are kept by line in order too: walked alongside the lines.
+  auto b = file.branches.begin();
+  const auto branchesEnd = file.branches.end();
   for (const auto& [line, hits] : file.lines) {
     while (next < ranges.size() && ranges[next].start <= line) open.push_back(&ranges[next++]);
     const Range* best = nullptr;
@@ -81,8 +84,8 @@ LaidOutRecord layOutRecord(const ImportedFile& file) {
       ++it;
     }
     LaidOutLine l{line, saturatedCount(hits), {}};
-    auto b = file.branches.find(line);
-    if (b != file.branches.end()) {
+    while (b != branchesEnd && b->first < line) ++b;
+    if (b != branchesEnd && b->first == line) {
       // A branch taken more often than its line ran (possible only in odd or merged data)
       // would raise the line's count; nor can a line that never ran have taken a branch.
       for (const auto& [key, taken] : b->second)
