@@ -13,6 +13,7 @@
 #include "coverage/kgv_file_ref.h"
 #include "coverage/string_block.h"
 #include "coverage/summary_sort.h"
+#include "support/parallel_runs.h"
 #include "support/string_helpers.h"
 
 namespace {
@@ -71,7 +72,9 @@ class FileCounter {
  public:
   FileCounter(SumFile& file, std::uint32_t policy, const CvgAdjustSet* set)
       : f_(file), policy_(policy), set_(set), map_(file.record->map),
-        counts_(file.record->counts) {}
+        counts_(file.record->counts) {
+    countUnusedLine(plainUnused_, 0);
+  }
 
   ErrorCode run();
 
@@ -83,6 +86,8 @@ class FileCounter {
   std::uint32_t line(std::size_t i) const { return mapValue(map_[i]); }
   std::uint16_t count(std::size_t i) const { return i < counts_.size() ? counts_[i] : 0; }
   ErrorCode scanBlocks(SumFunc& fn, std::size_t start, std::size_t end, bool orderCheck);
+  void accountLines(SumFunc& fn, std::size_t start, std::size_t end);
+  ErrorCode countInOnePass(SumFunc& fn, std::size_t start, std::size_t& end, bool& inOrder);
   void account(SumCounts& c, std::uint32_t lineNo, std::uint16_t hits) const;
 
   SumFile& f_;
@@ -90,6 +95,7 @@ class FileCounter {
   const CvgAdjustSet* set_;
   std::vector<std::uint32_t>& map_;
   std::vector<std::uint16_t>& counts_;
+  SumCounts plainUnused_;  // what an unused line without adjustments adds
 };
 
 ErrorCode FileCounter::scanBlocks(SumFunc& fn, std::size_t start, std::size_t end,
@@ -133,6 +139,64 @@ ErrorCode FileCounter::scanBlocks(SumFunc& fn, std::size_t start, std::size_t en
   return allOK;
 }
 
+// The lines of a function's blocks from start to end, which are in line order.
+void FileCounter::accountLines(SumFunc& fn, std::size_t s, std::size_t end) {
+  std::uint32_t l = line(s);
+  std::uint16_t c = count(s);
+  std::uint16_t b = c;
+  fn.firstLine = l;
+  for (std::size_t k = nextUsed(s + 1, end); k < end; k = nextUsed(k + 1, end)) {
+    if (mapTag(map_[k]) == TagBlock) b = count(k);
+    if (line(k) != l) {
+      account(fn.counts, l, c);
+      c = b;
+      l = line(k);
+    } else {
+      c = combineHits(policy_, c, b);
+    }
+  }
+  account(fn.counts, l, c);
+  fn.lastLine = l;
+}
+
+// scanBlocks and accountLines at once, for blocks in line order (inOrder false: the counts
+// are to be thrown away).
+ErrorCode FileCounter::countInOnePass(SumFunc& fn, std::size_t s, std::size_t& end, bool& inOrder) {
+  if (mapTag(map_[s]) != TagBlock) return corruptKgvFile;
+  const std::uint32_t* map = map_.data();
+  const bool allCounts = counts_.size() >= end;
+  std::uint32_t l = line(s);
+  std::uint16_t c = count(s);
+  std::uint16_t b = c;
+  fn.firstLine = l;
+  ++fn.counts.blocks;
+  if (c == 0) ++fn.counts.unusedBlocks;
+  for (std::size_t k = s + 1; k < end; ++k) {
+    const std::uint32_t e = map[k];
+    const std::uint32_t tag = mapTag(e);
+    if (tag == TagEmpty) continue;
+    const std::uint32_t at = mapValue(e);
+    if (tag == TagBlock) {
+      b = allCounts ? counts_[k] : count(k);
+      ++fn.counts.blocks;
+      if (b == 0) ++fn.counts.unusedBlocks;
+    } else if (tag != TagBlockLine) {
+      return corruptKgvFile;
+    }
+    if (at < l) inOrder = false;
+    if (at != l) {
+      account(fn.counts, l, c);
+      c = b;
+      l = at;
+    } else {
+      c = combineHits(policy_, c, b);
+    }
+  }
+  account(fn.counts, l, c);
+  fn.lastLine = l;
+  return allOK;
+}
+
 void FileCounter::account(SumCounts& c, std::uint32_t lineNo, std::uint16_t hits) const {
   ++c.lines;
   if (hits != 0) {
@@ -140,6 +204,15 @@ void FileCounter::account(SumCounts& c, std::uint32_t lineNo, std::uint16_t hits
     return;
   }
   ++c.unusedLines;
+  if (!set_) {
+    // Most files have no adjustments: no lookup for each of their lines.
+    c.adjLines += plainUnused_.adjLines;
+    c.adjUnusedLines += plainUnused_.adjUnusedLines;
+    c.deadLines += plainUnused_.deadLines;
+    c.testedLines += plainUnused_.testedLines;
+    c.inspectedLines += plainUnused_.inspectedLines;
+    return;
+  }
   countUnusedLine(c, dominantAdjust(adjustBits(set_, lineNo)));
 }
 
@@ -173,24 +246,18 @@ ErrorCode FileCounter::run() {
         fn.firstLine = fn.lastLine = line(next);
         std::size_t s = nextUsed(next + 1, end);
         if (s < end) {
-          ErrorCode rc = scanBlocks(fn, s, end, true);
+          // Blocks and lines in one pass over the entries; blocks out of line order (rare)
+          // are put in order first and counted again.
+          std::size_t stop = end;
+          bool inOrder = true;
+          ErrorCode rc = countInOnePass(fn, s, stop, inOrder);
           if (rc != allOK) return rc;
-          std::uint32_t l = line(s);
-          std::uint16_t c = count(s);
-          std::uint16_t b = c;
-          fn.firstLine = l;
-          for (std::size_t k = nextUsed(s + 1, end); k < end; k = nextUsed(k + 1, end)) {
-            if (mapTag(map_[k]) == TagBlock) b = count(k);
-            if (line(k) != l) {
-              account(fn.counts, l, c);
-              c = b;
-              l = line(k);
-            } else {
-              c = combineHits(policy_, c, b);
-            }
+          if (!inOrder) {
+            fn.counts = SumCounts{};
+            rc = scanBlocks(fn, s, end, true);
+            if (rc != allOK) return rc;
+            accountLines(fn, s, end);
           }
-          account(fn.counts, l, c);
-          fn.lastLine = l;
         }
         f_.lineCount = std::max(f_.lineCount, fn.lastLine);
       }
@@ -283,8 +350,34 @@ void addTimes(std::uint32_t& first, std::uint32_t& last, std::uint32_t f, std::u
   last = std::max(last, l);
 }
 
+std::size_t gEntriesForThreads = std::size_t(4) << 20;
+
+// Counts every file; files are independent of each other, so large data are counted on
+// several threads. Each file's code is kept for the caller to take in order.
+std::vector<ErrorCode> countFiles(SumRoot& root, std::uint32_t policy, const AdjustIndex& index) {
+  std::vector<std::pair<SumDir*, SumFile*>> files;
+  for (SumDir& d : root.dirRecords)
+    for (SumFile& f : d.fileRecords) files.emplace_back(&d, &f);
+  std::vector<ErrorCode> codes(files.size(), allOK);
+  auto count = [&](std::size_t from, std::size_t to) {
+    for (std::size_t k = from; k < to; ++k) {
+      try {
+        codes[k] = FileCounter(*files[k].second, policy, index.find(*files[k].first, *files[k].second)).run();
+      } catch (const std::bad_alloc&) {
+        codes[k] = outOfMemory;
+      }
+    }
+  };
+  runInParallel(
+      files.size(), [&](std::size_t k) { return files[k].second->record ? files[k].second->record->map.size() : 0; },
+      gEntriesForThreads, count);
+  return codes;
+}
+
 ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustIndex& index,
                             MessageSink& messages, bool withLineStates) {
+  const std::vector<ErrorCode> codes = countFiles(root, policy, index);
+  std::size_t fileNo = 0;
   root.counts = SumCounts{};
   root.funcs = root.unusedFuncs = root.deadFuncs = root.files = 0;
   root.firstTime = 0x7FFFFFFF;
@@ -295,9 +388,7 @@ ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustInd
     d.firstTime = 0x7FFFFFFF;
     d.lastTime = 0;
     for (SumFile& f : d.fileRecords) {
-      const CvgAdjustSet* set = index.find(d, f);
-      ErrorCode rc = FileCounter(f, policy, set).run();
-      if (rc != allOK) return rc;
+      if (ErrorCode rc = codes[fileNo++]; rc != allOK) return rc;
       d.counts += f.counts;
       d.funcs += f.funcs;
       d.unusedFuncs += f.unusedFuncs;
@@ -472,6 +563,12 @@ ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPo
 }
 
 }  // namespace
+
+void setSummaryThreadThreshold(std::size_t mapEntries) {
+  gEntriesForThreads = mapEntries;
+  // A function's sort costs about what counting sixteen of its entries does.
+  setSortThreadThreshold(mapEntries / 16);
+}
 
 ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
                        const AdjustmentList& adjustments, MessageSink& messages,

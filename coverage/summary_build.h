@@ -42,6 +42,10 @@ ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hit
                        const AdjustmentList& adjustments, MessageSink& messages,
                        std::unique_ptr<SumRoot>& out, bool withLineStates = true);
 
+// Data with at least this many map entries in all are counted on several threads (the
+// default is a few million; tests set 0 to have every summary counted so).
+void setSummaryThreadThreshold(std::size_t mapEntries);
+
 // Counts again over an existing tree (after the adjustments changed), and line states where
 // the tree keeps them; the records, names and order stay.
 ErrorCode recomputeSummary(SumRoot& root, std::uint32_t hitsPolicy,

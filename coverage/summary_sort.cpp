@@ -5,6 +5,10 @@
 #include <algorithm>
 #include <cstring>
 #include <functional>
+#include <new>
+#include <vector>
+
+#include "support/parallel_runs.h"
 
 namespace {
 
@@ -129,13 +133,30 @@ SortComparison sortComparator(std::uint32_t id) {
   }
 }
 
+namespace {
+std::size_t gFunctionsForThreads = std::size_t(256) << 10;
+}  // namespace
+
+void setSortThreadThreshold(std::size_t functions) { gFunctionsForThreads = functions; }
+
 ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder) {
   SortComparison cmp = sortComparator(sortOrder);
   if (!cmp) return allOK;
   sortLevel(root.dirOrder, cmp);
-  for (SumDir* d : root.dirOrder) {
-    sortLevel(d->fileOrder, cmp);
-    for (SumFile* f : d->fileOrder) sortLevel(f->funcOrder, cmp);
+  for (SumDir* d : root.dirOrder) sortLevel(d->fileOrder, cmp);
+  // Each file's functions are sorted apart from the others': many files, on a few threads.
+  try {
+    std::vector<SumFile*> files;
+    for (SumDir* d : root.dirOrder) files.insert(files.end(), d->fileOrder.begin(), d->fileOrder.end());
+    runInParallel(
+        files.size(), [&](std::size_t k) { return files[k]->funcOrder.size(); }, gFunctionsForThreads,
+        [&](std::size_t from, std::size_t to) {
+          for (std::size_t k = from; k < to; ++k) sortLevel(files[k]->funcOrder, cmp);
+        });
+  } catch (const std::bad_alloc&) {
+    // No room for the list of files: one file after the other.
+    for (SumDir* d : root.dirOrder)
+      for (SumFile* f : d->fileOrder) sortLevel(f->funcOrder, cmp);
   }
   root.sortOrder = sortOrder;
   return allOK;

@@ -24,3 +24,6 @@ SortComparison sortComparator(std::uint32_t id);
 // Sorts dirOrder, every fileOrder and every funcOrder by the order and stores it in the
 // root. Ids outside 1..17 leave the tree as it is.
 ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder);
+// Summaries with at least this many functions have them sorted on several threads (tests
+// set 0).
+void setSortThreadThreshold(std::size_t functions);

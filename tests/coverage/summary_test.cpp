@@ -521,6 +521,37 @@ std::unique_ptr<ObjRecord> randomRecord(std::mt19937& rng, int n) {
   return r;
 }
 
+// "" when both trees have the same counts in every row, else where they differ.
+std::string sameFigures(const SumRoot& a, const SumRoot& b) {
+  auto same = [](const SumCounts& x, const SumCounts& y) {
+    return x.lines == y.lines && x.unusedLines == y.unusedLines && x.blocks == y.blocks &&
+           x.unusedBlocks == y.unusedBlocks && x.deadLines == y.deadLines && x.testedLines == y.testedLines &&
+           x.inspectedLines == y.inspectedLines && x.adjLines == y.adjLines && x.adjUnusedLines == y.adjUnusedLines;
+  };
+  if (!same(a.counts, b.counts) || a.funcs != b.funcs || a.unusedFuncs != b.unusedFuncs) return "total";
+  if (a.dirRecords.size() != b.dirRecords.size()) return "directories";
+  for (std::size_t d = 0; d < a.dirRecords.size(); ++d) {
+    const SumDir &x = a.dirRecords[d], &y = b.dirRecords[d];
+    if (!same(x.counts, y.counts) || x.fileRecords.size() != y.fileRecords.size()) return x.name;
+    for (std::size_t f = 0; f < x.fileRecords.size(); ++f) {
+      const SumFile &p = x.fileRecords[f], &q = y.fileRecords[f];
+      if (!same(p.counts, q.counts) || p.lineCount != q.lineCount || p.functions.size() != q.functions.size())
+        return p.name;
+      for (std::size_t k = 0; k < p.functions.size(); ++k) {
+        if (!same(p.functions[k].counts, q.functions[k].counts)) return p.functions[k].name;
+        // And the same order.
+        if (p.funcOrder[k]->nativeIndex != q.funcOrder[k]->nativeIndex) return std::string("order in ") + p.name;
+      }
+    }
+  }
+  for (std::size_t d = 0; d < a.dirOrder.size(); ++d) {
+    if (std::string(a.dirOrder[d]->name) != b.dirOrder[d]->name) return "directory order";
+    for (std::size_t f = 0; f < a.dirOrder[d]->fileOrder.size(); ++f)
+      if (std::string(a.dirOrder[d]->fileOrder[f]->name) != b.dirOrder[d]->fileOrder[f]->name) return "file order";
+  }
+  return "";
+}
+
 }  // namespace
 
 TEST(SummaryTree, DamagedMapsGiveCorruptDataOrATreeButNeverACrash) {
@@ -550,6 +581,13 @@ TEST(SummaryTree, DamagedMapsGiveCorruptDataOrATreeButNeverACrash) {
             ASSERT_EQ(segmented[i].adjustedClass, lineByLine[i].adjustedClass) << f.name << " line " << i + 1;
           }
         }
+      // Counted on several threads, every row has the same figures.
+      setSummaryThreadThreshold(0);
+      std::unique_ptr<SumRoot> threaded;
+      ErrorCode threadedRc = buildSummary(data, 1 + round % 17, 1 + round % 4, adj, gMessages, threaded);
+      setSummaryThreadThreshold(std::size_t(4) << 20);
+      ASSERT_EQ(threadedRc, allOK);
+      ASSERT_EQ(sameFigures(*root, *threaded), "");
       ASSERT_EQ(recomputeSummary(*root, hitsMin, AdjustmentList{}, gMessages), allOK);
       // A second build over the data as the first one left it succeeds too.
       std::unique_ptr<SumRoot> again;
