@@ -46,15 +46,9 @@ void ImportedFile::reindexFunctions() {
   for (size_t i = 0; i < functions.size(); ++i) functionIndex.emplace(functions[i].key, i);
 }
 
-void ImportedFile::addBranch(std::uint32_t line, const BranchKey& key, std::uint64_t taken) {
-  std::uint64_t& t = branches.slot(line).slot(key);
-  t = addCounts(t, taken);
-}
-
 void ImportedFile::settle() {
   lines.settle();
   branches.settle();
-  for (auto& [line, outcomes] : branches) outcomes.settle();
 }
 
 namespace {

@@ -62,10 +62,10 @@ class SortedMap {
   }
 
   // The value of `key`, value-initialised when it is new.
-  V& slot(const K& key) {
+  V& slot(K key) {
     if (sorted_ == items_.size()) {
       if (items_.empty() || Less()(items_.back().first, key)) {
-        items_.emplace_back(key, V());
+        items_.emplace_back(std::move(key), V());
         ++sorted_;
         return items_.back().second;
       }
@@ -74,7 +74,7 @@ class SortedMap {
     auto end = items_.begin() + static_cast<std::ptrdiff_t>(sorted_);
     auto it = std::lower_bound(items_.begin(), end, key, KeyLess());
     if (it != end && !Less()(key, it->first)) return it->second;
-    items_.emplace_back(key, V());
+    items_.emplace_back(std::move(key), V());
     return items_.back().second;
   }
 
@@ -161,15 +161,107 @@ struct AddCountsInto {
   void operator()(std::uint64_t& into, std::uint64_t from) const { into = addCounts(into, from); }
 };
 
-using LineBranches = SortedMap<BranchKey, std::uint64_t, BranchOrder, AddCountsInto>;
+// A branch outcome at its line.
+struct BranchAt {
+  std::uint32_t line;
+  BranchKey key;
+};
 
-struct MergeLineBranches {
-  void operator()(LineBranches& into, LineBranches&& from) const {
-    for (auto& [key, taken] : from) {
-      std::uint64_t& t = into.slot(key);
-      t = addCounts(t, taken);
-    }
+struct BranchAtOrder {
+  bool operator()(const BranchAt& a, const BranchAt& b) const {
+    return a.line != b.line ? a.line < b.line : BranchOrder()(a.key, b.key);
   }
+};
+
+// The branch outcomes of a file, all in one vector by line and outcome (a file has many
+// lines of a few outcomes each); read as a map of line -> outcome -> times taken.
+class FileBranches {
+ public:
+  using Outcomes = SortedMap<BranchAt, std::uint64_t, BranchAtOrder, AddCountsInto>;
+  using Entry = Outcomes::value_type;
+  using EntryIterator = Outcomes::const_iterator;
+
+  // The outcomes of one line, each read as (BranchKey, times taken).
+  class Line {
+   public:
+    class iterator {
+     public:
+      iterator() = default;
+      explicit iterator(EntryIterator at) : at_(at) {}
+      std::pair<const BranchKey&, std::uint64_t> operator*() const { return {at_->first.key, at_->second}; }
+      iterator& operator++() {
+        ++at_;
+        return *this;
+      }
+      bool operator==(const iterator& o) const { return at_ == o.at_; }
+      bool operator!=(const iterator& o) const { return at_ != o.at_; }
+
+     private:
+      EntryIterator at_;
+    };
+    Line(EntryIterator begin, EntryIterator end) : begin_(begin), end_(end) {}
+    iterator begin() const { return iterator(begin_); }
+    iterator end() const { return iterator(end_); }
+    size_t size() const { return static_cast<size_t>(end_ - begin_); }
+
+   private:
+    EntryIterator begin_, end_;
+  };
+
+  // Lines in order, each read as (line, Line).
+  class iterator {
+   public:
+    iterator(EntryIterator at, EntryIterator end) : at_(at), end_(end) {}
+    std::pair<std::uint32_t, Line> operator*() const { return {at_->first.line, Line(at_, lineEnd())}; }
+    iterator& operator++() {
+      at_ = lineEnd();
+      return *this;
+    }
+    bool operator==(const iterator& o) const { return at_ == o.at_; }
+    bool operator!=(const iterator& o) const { return at_ != o.at_; }
+
+   private:
+    EntryIterator lineEnd() const {
+      EntryIterator e = at_;
+      while (e != end_ && e->first.line == at_->first.line) ++e;
+      return e;
+    }
+    EntryIterator at_, end_;
+  };
+
+  void add(std::uint32_t line, BranchKey key, std::uint64_t taken) {
+    std::uint64_t& t = outcomes_.slot(BranchAt{line, std::move(key)});
+    t = addCounts(t, taken);
+  }
+  void settle() const { outcomes_.settle(); }
+  // Every outcome, by line then outcome.
+  const Outcomes& outcomes() const { return outcomes_; }
+
+  iterator begin() const { return iterator(outcomes_.begin(), outcomes_.end()); }
+  iterator end() const { return iterator(outcomes_.end(), outcomes_.end()); }
+  bool empty() const { return outcomes_.empty(); }
+  // Lines with outcomes.
+  size_t size() const {
+    size_t n = 0;
+    for (auto it = begin(); it != end(); ++it) ++n;
+    return n;
+  }
+  Line at(std::uint32_t line) const {
+    auto first = std::lower_bound(outcomes_.begin(), outcomes_.end(), line,
+                                  [](const Entry& e, std::uint32_t l) { return e.first.line < l; });
+    auto last = first;
+    while (last != outcomes_.end() && last->first.line == line) ++last;
+    if (first == last) throw std::out_of_range("FileBranches::at");
+    return Line(first, last);
+  }
+  // Drops the outcomes of every line `pred` holds.
+  template <class Pred>
+  void eraseLines(Pred pred) {
+    outcomes_.eraseKeys([&](const BranchAt& at) { return pred(at.line); });
+  }
+
+ private:
+  Outcomes outcomes_;
 };
 
 // Hash of std::string that also takes a string_view, so that lookups build no string.
@@ -186,8 +278,7 @@ struct ImportedFile {
   // By key; kept only once a file has many functions, as a scan is quicker for a few.
   NameIndex functionIndex;
   SortedMap<std::uint32_t, std::uint64_t, std::less<std::uint32_t>, AddCountsInto> lines;  // line -> hits
-  SortedMap<std::uint32_t, LineBranches, std::less<std::uint32_t>, MergeLineBranches>
-      branches;            // line -> outcome -> times taken
+  FileBranches branches;   // line -> outcome -> times taken
   std::uint64_t runs = 0;  // 0 when the input does not say
   bool namesDue = false;   // functions added since naming
   // Read from gcov, whose data lcov filters by the exclusion markers in the source; lcov's
@@ -200,7 +291,9 @@ struct ImportedFile {
     std::uint64_t& h = lines.slot(line);
     h = addCounts(h, hits);
   }
-  void addBranch(std::uint32_t line, const BranchKey& key, std::uint64_t taken);
+  void addBranch(std::uint32_t line, BranchKey key, std::uint64_t taken) {
+    branches.add(line, std::move(key), taken);
+  }
   // Puts lines and branches that came out of order in place; the readers call it when a
   // record is complete, so that later reads change nothing.
   void settle();

@@ -45,7 +45,7 @@ void apply(ImportedFile& file, const Exclusions& e) {
   // One pass over each map: a section may mark many lines.
   if (!e.lines.empty()) file.lines.eraseKeys([&](std::uint32_t l) { return e.lines.count(l) != 0; });
   if (!e.lines.empty() || !e.branches.empty())
-    file.branches.eraseKeys([&](std::uint32_t l) { return e.lines.count(l) != 0 || e.branches.count(l) != 0; });
+    file.branches.eraseLines([&](std::uint32_t l) { return e.lines.count(l) != 0 || e.branches.count(l) != 0; });
   auto excluded = [&](const ImportedFunction& f) { return e.lines.count(f.startLine) != 0; };
   if (std::none_of(file.functions.begin(), file.functions.end(), excluded)) return;
   file.functions.erase(std::remove_if(file.functions.begin(), file.functions.end(), excluded), file.functions.end());

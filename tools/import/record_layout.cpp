@@ -22,19 +22,47 @@ std::uint32_t fnv1a(std::uint32_t h, const void* data, size_t n) {
 }  // namespace
 
 LaidOutRecord layOutRecord(const ImportedFile& file) {
+  LayoutPlan plan;
+  planLayout(file, plan);
   LaidOutRecord rec;
   rec.path = file.path;
   rec.sessions = saturatedCount(file.runs == 0 ? 1 : file.runs);
+  for (const ImportedFunction* f : plan.functions)
+    rec.functions.push_back({f->name, f->startLine, saturatedCount(f->calls), {}});
 
+  std::vector<LaidOutLine> fileScope;
+  // Branches are kept by line in order too: walked alongside the lines.
+  auto b = file.branches.outcomes().begin();
+  const auto branchesEnd = file.branches.outcomes().end();
+  size_t i = 0;
+  for (const auto& [line, hits] : file.lines) {
+    LaidOutLine l{line, saturatedCount(hits), {}};
+    while (b != branchesEnd && b->first.line < line) ++b;
+    // A branch taken more often than its line ran (possible only in odd or merged data)
+    // would raise the line's count; nor can a line that never ran have taken a branch.
+    for (; b != branchesEnd && b->first.line == line; ++b) l.branches.push_back(std::min(saturatedCount(b->second), l.hits));
+    std::uint32_t owner = plan.owner[i++];
+    if (owner < plan.functions.size()) rec.functions[owner].lines.push_back(std::move(l));
+    else fileScope.push_back(std::move(l));
+  }
+  if (!fileScope.empty()) {
+    // Not a real function: it counts as called when any of its lines ran.
+    rec.functions.push_back({kFileScopeName, plan.fileScopeFirst, static_cast<std::uint16_t>(plan.fileScopeRan ? 1 : 0),
+                             std::move(fileScope)});
+  }
+  rec.signature = lineSetSignature(file);
+  return rec;
+}
+
+void planLayout(const ImportedFile& file, LayoutPlan& plan) {
   // Functions of one line in the order of their names, as the merge orders them.
-  std::vector<const ImportedFunction*> funcs;
+  std::vector<const ImportedFunction*>& funcs = plan.functions;
+  funcs.clear();
   for (const auto& f : file.functions) funcs.push_back(&f);
   std::stable_sort(funcs.begin(), funcs.end(), [](const ImportedFunction* a, const ImportedFunction* b) {
     if (a->startLine != b->startLine) return a->startLine < b->startLine;
     return a->name < b->name;
   });
-  for (const ImportedFunction* f : funcs)
-    rec.functions.push_back({f->name, f->startLine, saturatedCount(f->calls), {}});
 
   // One range per group of functions starting on one line. Known ends are used as they
   // are; otherwise the group reaches to the line before the next function that starts
@@ -65,12 +93,14 @@ LaidOutRecord layOutRecord(const ImportedFile& file) {
 
   // Sweep the lines in order with the ranges that have started; the innermost holding
   // range is the one that started last (ties: the one that ends first).
-  std::vector<LaidOutLine> fileScope;
+  plan.owner.clear();
+  plan.owner.reserve(file.lines.size());
+  plan.fileScopeLines = 0;
+  plan.fileScopeFirst = 0;
+  plan.fileScopeRan = false;
+  const auto outside = static_cast<std::uint32_t>(funcs.size());
   std::vector<const Range*> open;
   size_t next = 0;
-  // Branches are kept by line in order too: walked alongside the lines.
-  auto b = file.branches.begin();
-  const auto branchesEnd = file.branches.end();
   for (const auto& [line, hits] : file.lines) {
     while (next < ranges.size() && ranges[next].start <= line) open.push_back(&ranges[next++]);
     const Range* best = nullptr;
@@ -83,31 +113,21 @@ LaidOutRecord layOutRecord(const ImportedFile& file) {
         best = *it;
       ++it;
     }
-    LaidOutLine l{line, saturatedCount(hits), {}};
-    while (b != branchesEnd && b->first < line) ++b;
-    if (b != branchesEnd && b->first == line) {
-      // A branch taken more often than its line ran (possible only in odd or merged data)
-      // would raise the line's count; nor can a line that never ran have taken a branch.
-      for (const auto& [key, taken] : b->second)
-        l.branches.push_back(std::min(saturatedCount(taken), l.hits));
+    if (best) {
+      plan.owner.push_back(static_cast<std::uint32_t>(best->function));
+      continue;
     }
-    if (best) rec.functions[best->function].lines.push_back(std::move(l));
-    else fileScope.push_back(std::move(l));
+    plan.owner.push_back(outside);
+    if (plan.fileScopeLines++ == 0) plan.fileScopeFirst = line;
+    plan.fileScopeRan = plan.fileScopeRan || saturatedCount(hits) != 0;
   }
-  if (!fileScope.empty()) {
-    // Not a real function: it counts as called when any of its lines ran.
-    bool ran = std::any_of(fileScope.begin(), fileScope.end(),
-                           [](const LaidOutLine& l) { return l.hits != 0; });
-    std::uint32_t first = fileScope.front().line;
-    rec.functions.push_back(
-        {kFileScopeName, first, static_cast<std::uint16_t>(ran ? 1 : 0), std::move(fileScope)});
-  }
+}
 
+std::uint32_t lineSetSignature(const ImportedFile& file) {
   // Stands in for the source's content when that cannot be read: two captures of a file
   // then merge as one version only when they hold the same lines.
   std::uint32_t h = 2166136261u;
-  h = fnv1a(h, rec.path.data(), rec.path.size() + 1);
+  h = fnv1a(h, file.path.data(), file.path.size() + 1);
   for (const auto& [line, hits] : file.lines) h = fnv1a(h, &line, sizeof line);
-  rec.signature = h == 0 ? 1 : h;
-  return rec;
+  return h == 0 ? 1 : h;
 }

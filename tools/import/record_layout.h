@@ -37,6 +37,22 @@ struct LaidOutRecord {
   std::uint32_t signature;  // non-zero hash of the path and the line set
 };
 
+// Where the lines of a file go, as layOutRecord lays them out: the importer builds its
+// records from this directly, without the copies a LaidOutRecord holds.
+struct LayoutPlan {
+  std::vector<const ImportedFunction*> functions;  // in the record's order
+  // For each line of the file, in order: the index of its function, or functions.size()
+  // for the lines outside every function.
+  std::vector<std::uint32_t> owner;
+  size_t fileScopeLines = 0;
+  std::uint32_t fileScopeFirst = 0;
+  bool fileScopeRan = false;  // any line outside every function ran
+};
+void planLayout(const ImportedFile& file, LayoutPlan& plan);
+
+// The signature that stands for a source that cannot be read: its path and line set.
+std::uint32_t lineSetSignature(const ImportedFile& file);
+
 // The name of the function that holds the lines outside every function.
 extern const char* const kFileScopeName;
 
