@@ -3,6 +3,7 @@
 #include "tools/import/coverage_import.h"
 
 #include <cxxabi.h>
+#include <fcntl.h>
 #include <limits.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -278,14 +279,59 @@ std::string ImportError::text() const {
 }
 
 namespace {
+
 constexpr std::uint64_t kInflationRatio = 64;
 constexpr std::uint64_t kInflationFloor = std::uint64_t{64} << 20;
 constexpr std::uint64_t kMaxInflated = std::uint64_t{4} << 30;
+
+enum class PlainRead { notPlain, failed, read };
+
+// Reads a regular file that does not start as gzip data does; notPlain, with `text` and
+// `error` untouched, where gzread is to read it instead.
+PlainRead readPlainFile(const std::string& path, std::string& text, ImportError& error) {
+  int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+  if (fd < 0) return PlainRead::notPlain;
+  struct stat st;
+  unsigned char magic[2];
+  if (fstat(fd, &st) != 0 || !S_ISREG(st.st_mode) || pread(fd, magic, 2, 0) != 2 ||
+      (magic[0] == 0x1f && magic[1] == 0x8b)) {
+    close(fd);
+    return PlainRead::notPlain;
+  }
+  text.clear();
+  // Room for one byte more than the size, so that reaching the end needs no second buffer.
+  text.resize(static_cast<size_t>(st.st_size) + 1);
+  size_t have = 0;
+  for (;;) {
+    if (have == text.size()) text.resize(text.size() * 2);
+    ssize_t n = read(fd, text.data() + have, text.size() - have);
+    if (n < 0 && errno == EINTR) continue;
+    if (n < 0) {
+      error.message = std::string("cannot read: ") + strerror(errno);
+      close(fd);
+      text.clear();
+      return PlainRead::failed;
+    }
+    if (n == 0) break;
+    have += static_cast<size_t>(n);
+  }
+  close(fd);
+  text.resize(have);
+  return PlainRead::read;
+}
+
 }  // namespace
 
 bool readInputText(const std::string& path, std::string& text, ImportError& error) {
   error.file = path;
   error.line = 0;
+  // A plain file is read in one go into its full size; gzread, which passes plain files
+  // through unchanged, would copy it piece by piece into a growing string.
+  switch (readPlainFile(path, text, error)) {
+    case PlainRead::read: return true;
+    case PlainRead::failed: return false;
+    case PlainRead::notPlain: break;
+  }
   // A compressed input may inflate to no more than this: real coverage reports compress
   // perhaps thirty-fold, a crafted one a thousand-fold and more, to fill the memory.
   struct stat st;
