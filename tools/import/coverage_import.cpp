@@ -54,12 +54,12 @@ void ImportedFile::settle() {
 
 namespace {
 
-bool allDigits(const std::string& s) {
+bool allDigits(std::string_view s) {
   return !s.empty() && std::all_of(s.begin(), s.end(), [](char c) { return c >= '0' && c <= '9'; });
 }
 
 // -1, 0 or 1; numbers (of any length) before words, in numeric order.
-int compareWords(const std::string& a, const std::string& b) {
+int compareWords(std::string_view a, std::string_view b) {
   bool na = allDigits(a), nb = allDigits(b);
   if (na != nb) return na ? -1 : 1;
   if (na) {
@@ -158,6 +158,117 @@ void nameFileFunctions(ImportedFile& file) {
 }
 
 }  // namespace
+
+int compareBranchWords(std::string_view a, std::string_view b) { return compareWords(a, b); }
+
+namespace {
+
+// A number below FileBranches::kWord written as std::to_string writes it: such words are
+// kept as their numbers, and compare in BranchOrder's order as numbers do.
+bool plainNumber(std::string_view w, std::uint32_t& value) {
+  if (w.empty() || w.size() > 10 || (w[0] == '0' && w.size() > 1)) return false;
+  std::uint64_t v = 0;
+  for (char c : w) {
+    if (c < '0' || c > '9') return false;
+    v = v * 10 + static_cast<unsigned>(c - '0');
+  }
+  if (v >= FileBranches::kWord) return false;
+  value = static_cast<std::uint32_t>(v);
+  return true;
+}
+
+}  // namespace
+
+std::uint32_t FileBranches::code(std::string_view w) {
+  std::uint32_t v;
+  if (plainNumber(w, v)) return v;
+  // Words are few; a file lists them once each.
+  if (wordIndex_.empty()) {
+    for (size_t i = 0; i < words_.size(); ++i)
+      if (words_[i] == w) return kWord + static_cast<std::uint32_t>(i);
+  } else {
+    auto it = wordIndex_.find(std::string(w));
+    if (it != wordIndex_.end()) return kWord + it->second;
+  }
+  words_.emplace_back(w);
+  auto at = static_cast<std::uint32_t>(words_.size() - 1);
+  if (!wordIndex_.empty()) {
+    wordIndex_.emplace(words_.back(), at);
+  } else if (words_.size() > 16) {
+    for (size_t i = 0; i < words_.size(); ++i) wordIndex_.emplace(words_[i], static_cast<std::uint32_t>(i));
+  }
+  return kWord + at;
+}
+
+std::string FileBranches::word(std::uint32_t code) const {
+  return code < kWord ? std::to_string(code) : words_[code - kWord];
+}
+
+bool FileBranches::less(const Outcome& a, const Outcome& b) const {
+  if (a.line != b.line) return a.line < b.line;
+  if (a.block != b.block) {
+    if (a.block < kWord && b.block < kWord) return a.block < b.block;
+    return compareWords(word(a.block), word(b.block)) < 0;
+  }
+  if (a.branch != b.branch) {
+    if (a.branch < kWord && b.branch < kWord) return a.branch < b.branch;
+    return compareWords(word(a.branch), word(b.branch)) < 0;
+  }
+  return false;
+}
+
+void FileBranches::add(std::uint32_t line, std::string_view block, std::string_view branch, std::uint64_t taken) {
+  Outcome o{line, code(block), code(branch), taken};
+  if (sorted_ == items_.size()) {
+    if (items_.empty() || less(items_.back(), o)) {
+      items_.push_back(o);
+      ++sorted_;
+      return;
+    }
+    if (same(items_.back(), o)) {
+      items_.back().taken = addCounts(items_.back().taken, taken);
+      return;
+    }
+  }
+  auto end = items_.begin() + static_cast<std::ptrdiff_t>(sorted_);
+  auto it = std::lower_bound(items_.begin(), end, o, [this](const Outcome& x, const Outcome& y) { return less(x, y); });
+  if (it != end && same(*it, o)) {
+    it->taken = addCounts(it->taken, taken);
+    return;
+  }
+  items_.push_back(o);
+}
+
+void FileBranches::settle() const {
+  if (sorted_ == items_.size()) return;
+  auto order = [this](const Outcome& x, const Outcome& y) { return less(x, y); };
+  auto mid = items_.begin() + static_cast<std::ptrdiff_t>(sorted_);
+  std::sort(mid, items_.end(), order);
+  std::inplace_merge(items_.begin(), mid, items_.end(), order);
+  auto out = items_.begin();
+  for (auto it = items_.begin() + 1; it != items_.end(); ++it) {
+    if (same(*out, *it)) out->taken = addCounts(out->taken, it->taken);
+    else *++out = *it;
+  }
+  items_.erase(out + 1, items_.end());
+  sorted_ = items_.size();
+}
+
+size_t FileBranches::size() const {
+  size_t n = 0;
+  for (auto it = begin(); it != end(); ++it) ++n;
+  return n;
+}
+
+FileBranches::Line FileBranches::at(std::uint32_t line) const {
+  settle();
+  auto first = std::lower_bound(items_.begin(), items_.end(), line,
+                                [](const Outcome& o, std::uint32_t l) { return o.line < l; });
+  auto last = first;
+  while (last != items_.end() && last->line == line) ++last;
+  if (first == last) throw std::out_of_range("FileBranches::at");
+  return Line(this, first, last);
+}
 
 bool BranchOrder::operator()(const BranchKey& a, const BranchKey& b) const {
   int c = compareWords(a.block, b.block);

@@ -161,34 +161,32 @@ struct AddCountsInto {
   void operator()(std::uint64_t& into, std::uint64_t from) const { into = addCounts(into, from); }
 };
 
-// A branch outcome at its line.
-struct BranchAt {
-  std::uint32_t line;
-  BranchKey key;
-};
+// -1, 0 or 1 in BranchOrder's order of words.
+int compareBranchWords(std::string_view a, std::string_view b);
 
-struct BranchAtOrder {
-  bool operator()(const BranchAt& a, const BranchAt& b) const {
-    return a.line != b.line ? a.line < b.line : BranchOrder()(a.key, b.key);
-  }
-};
-
-// The branch outcomes of a file, all in one vector by line and outcome (a file has many
-// lines of a few outcomes each); read as a map of line -> outcome -> times taken.
+// The branch outcomes of a file, all in one vector by line and outcome; read as a map of
+// line -> outcome (a BranchKey) -> times taken. Outcomes are numbered by small numbers
+// (lcov's block and branch numbers), kept as numbers, so an outcome takes 24 bytes; other
+// words are kept once each in a list of the file's. Outcomes that come out of order wait
+// at the end until the next read, as in SortedMap.
 class FileBranches {
  public:
-  using Outcomes = SortedMap<BranchAt, std::uint64_t, BranchAtOrder, AddCountsInto>;
-  using Entry = Outcomes::value_type;
-  using EntryIterator = Outcomes::const_iterator;
+  struct Outcome {
+    std::uint32_t line;
+    std::uint32_t block;   // a number below kWord, or kWord + its place in words_
+    std::uint32_t branch;  // likewise
+    std::uint64_t taken;
+  };
+  static constexpr std::uint32_t kWord = 0x80000000u;
+  using OutcomeIterator = std::vector<Outcome>::const_iterator;
 
   // The outcomes of one line, each read as (BranchKey, times taken).
   class Line {
    public:
     class iterator {
      public:
-      iterator() = default;
-      explicit iterator(EntryIterator at) : at_(at) {}
-      std::pair<const BranchKey&, std::uint64_t> operator*() const { return {at_->first.key, at_->second}; }
+      iterator(const FileBranches* owner, OutcomeIterator at) : owner_(owner), at_(at) {}
+      std::pair<BranchKey, std::uint64_t> operator*() const { return {owner_->key(*at_), at_->taken}; }
       iterator& operator++() {
         ++at_;
         return *this;
@@ -197,22 +195,24 @@ class FileBranches {
       bool operator!=(const iterator& o) const { return at_ != o.at_; }
 
      private:
-      EntryIterator at_;
+      const FileBranches* owner_;
+      OutcomeIterator at_;
     };
-    Line(EntryIterator begin, EntryIterator end) : begin_(begin), end_(end) {}
-    iterator begin() const { return iterator(begin_); }
-    iterator end() const { return iterator(end_); }
+    Line(const FileBranches* owner, OutcomeIterator begin, OutcomeIterator end) : owner_(owner), begin_(begin), end_(end) {}
+    iterator begin() const { return iterator(owner_, begin_); }
+    iterator end() const { return iterator(owner_, end_); }
     size_t size() const { return static_cast<size_t>(end_ - begin_); }
 
    private:
-    EntryIterator begin_, end_;
+    const FileBranches* owner_;
+    OutcomeIterator begin_, end_;
   };
 
   // Lines in order, each read as (line, Line).
   class iterator {
    public:
-    iterator(EntryIterator at, EntryIterator end) : at_(at), end_(end) {}
-    std::pair<std::uint32_t, Line> operator*() const { return {at_->first.line, Line(at_, lineEnd())}; }
+    iterator(const FileBranches* owner, OutcomeIterator at, OutcomeIterator end) : owner_(owner), at_(at), end_(end) {}
+    std::pair<std::uint32_t, Line> operator*() const { return {at_->line, Line(owner_, at_, lineEnd())}; }
     iterator& operator++() {
       at_ = lineEnd();
       return *this;
@@ -221,47 +221,85 @@ class FileBranches {
     bool operator!=(const iterator& o) const { return at_ != o.at_; }
 
    private:
-    EntryIterator lineEnd() const {
-      EntryIterator e = at_;
-      while (e != end_ && e->first.line == at_->first.line) ++e;
+    OutcomeIterator lineEnd() const {
+      OutcomeIterator e = at_;
+      while (e != end_ && e->line == at_->line) ++e;
       return e;
     }
-    EntryIterator at_, end_;
+    const FileBranches* owner_;
+    OutcomeIterator at_, end_;
   };
 
-  void add(std::uint32_t line, BranchKey key, std::uint64_t taken) {
-    std::uint64_t& t = outcomes_.slot(BranchAt{line, std::move(key)});
-    t = addCounts(t, taken);
+  FileBranches() = default;
+  FileBranches(const FileBranches&) = default;
+  FileBranches& operator=(const FileBranches&) = default;
+  FileBranches(FileBranches&& o) noexcept
+      : items_(std::move(o.items_)), sorted_(o.sorted_), words_(std::move(o.words_)), wordIndex_(std::move(o.wordIndex_)) {
+    o.items_.clear();
+    o.sorted_ = 0;
   }
-  void settle() const { outcomes_.settle(); }
-  // Every outcome, by line then outcome.
-  const Outcomes& outcomes() const { return outcomes_; }
+  FileBranches& operator=(FileBranches&& o) noexcept {
+    if (this == &o) return *this;
+    items_ = std::move(o.items_);
+    sorted_ = o.sorted_;
+    words_ = std::move(o.words_);
+    wordIndex_ = std::move(o.wordIndex_);
+    o.items_.clear();
+    o.sorted_ = 0;
+    return *this;
+  }
 
-  iterator begin() const { return iterator(outcomes_.begin(), outcomes_.end()); }
-  iterator end() const { return iterator(outcomes_.end(), outcomes_.end()); }
-  bool empty() const { return outcomes_.empty(); }
+  void add(std::uint32_t line, std::string_view block, std::string_view branch, std::uint64_t taken);
+  // Puts the outcomes that came out of order in place; reads do it themselves.
+  void settle() const;
+  void reserve(size_t n) { items_.reserve(n); }
+
+  // Every outcome, by line then outcome.
+  const std::vector<Outcome>& outcomes() const {
+    settle();
+    return items_;
+  }
+  BranchKey key(const Outcome& o) const { return BranchKey{word(o.block), word(o.branch)}; }
+
+  iterator begin() const {
+    settle();
+    return iterator(this, items_.begin(), items_.end());
+  }
+  iterator end() const {
+    settle();
+    return iterator(this, items_.end(), items_.end());
+  }
+  bool empty() const { return items_.empty(); }
+  // Outcomes, all lines together.
+  size_t outcomeCount() const {
+    settle();
+    return items_.size();
+  }
   // Lines with outcomes.
-  size_t size() const {
-    size_t n = 0;
-    for (auto it = begin(); it != end(); ++it) ++n;
-    return n;
-  }
-  Line at(std::uint32_t line) const {
-    auto first = std::lower_bound(outcomes_.begin(), outcomes_.end(), line,
-                                  [](const Entry& e, std::uint32_t l) { return e.first.line < l; });
-    auto last = first;
-    while (last != outcomes_.end() && last->first.line == line) ++last;
-    if (first == last) throw std::out_of_range("FileBranches::at");
-    return Line(first, last);
-  }
+  size_t size() const;
+  Line at(std::uint32_t line) const;
   // Drops the outcomes of every line `pred` holds.
   template <class Pred>
   void eraseLines(Pred pred) {
-    outcomes_.eraseKeys([&](const BranchAt& at) { return pred(at.line); });
+    settle();
+    items_.erase(std::remove_if(items_.begin(), items_.end(), [&](const Outcome& o) { return pred(o.line); }),
+                 items_.end());
+    sorted_ = items_.size();
   }
 
  private:
-  Outcomes outcomes_;
+  std::uint32_t code(std::string_view word);
+  std::string word(std::uint32_t code) const;
+  bool less(const Outcome& a, const Outcome& b) const;
+  static bool same(const Outcome& a, const Outcome& b) {
+    return a.line == b.line && a.block == b.block && a.branch == b.branch;
+  }
+
+  // Reads settle the waiting outcomes, so these change under const.
+  mutable std::vector<Outcome> items_;
+  mutable size_t sorted_ = 0;  // outcomes in order, each once; the rest wait
+  std::vector<std::string> words_;
+  std::unordered_map<std::string, std::uint32_t> wordIndex_;
 };
 
 // Hash of std::string that also takes a string_view, so that lookups build no string.
@@ -291,8 +329,8 @@ struct ImportedFile {
     std::uint64_t& h = lines.slot(line);
     h = addCounts(h, hits);
   }
-  void addBranch(std::uint32_t line, BranchKey key, std::uint64_t taken) {
-    branches.add(line, std::move(key), taken);
+  void addBranch(std::uint32_t line, const BranchKey& key, std::uint64_t taken) {
+    branches.add(line, key.block, key.branch, taken);
   }
   // Puts lines and branches that came out of order in place; the readers call it when a
   // record is complete, so that later reads change nothing.

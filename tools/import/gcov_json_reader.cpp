@@ -157,7 +157,7 @@ struct Reader {
             std::uint64_t taken = 0;
             if (!br.is_object()) return fail(start, "a branch of line " + std::to_string(number) + " of " + file.path + " is not an object");
             unsignedField(br, "count", taken);
-            file.addBranch(number, BranchKey{"0", std::to_string(place++)}, taken);
+            file.branches.add(number, "0", std::to_string(place++), taken);
           }
         }
       }

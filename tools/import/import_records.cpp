@@ -160,9 +160,9 @@ std::unique_ptr<ObjRecord> makeFileRecord(const ImportedFile& file, const Layout
     const auto bEnd = outcomes.end();
     for (size_t i = 0; i < nLines; ++i) {
       std::uint32_t line = lineAt[i].first;
-      while (b != bEnd && b->first.line < line) ++b;
+      while (b != bEnd && b->line < line) ++b;
       branchFrom[i] = static_cast<std::uint32_t>(b - outcomes.begin());
-      while (b != bEnd && b->first.line == line) ++b, ++branchCount[i];
+      while (b != bEnd && b->line == line) ++b, ++branchCount[i];
       blocks += branchCount[i];
     }
   }
@@ -191,7 +191,7 @@ std::unique_ptr<ObjRecord> makeFileRecord(const ImportedFile& file, const Layout
       auto b = outcomes.begin() + branchFrom[i];
       // A branch taken more often than its line ran (possible only in odd or merged data)
       // would raise the line's count; nor can a line that never ran have taken a branch.
-      for (std::uint32_t n = 0; n < branchCount[i]; ++n, ++b) push(TagBlock, line, std::min(saturatedCount(b->second), hits));
+      for (std::uint32_t n = 0; n < branchCount[i]; ++n, ++b) push(TagBlock, line, std::min(saturatedCount(b->taken), hits));
     }
   };
   for (size_t k = 0; k < nFuncs; ++k) {

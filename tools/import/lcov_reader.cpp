@@ -1,4 +1,5 @@
 // lcov tracefiles (lcov 1.x and 2.x, llvm-cov's lcov export and the tools that follow them).
+#include <algorithm>
 #include <charconv>
 #include <cstring>
 #include <string_view>
@@ -20,10 +21,25 @@ struct Parser {
   std::string base;
   bool baseKnown = false;
 
+  // Sizes of the last record's file: the next new file is given room for as many, as the
+  // files of one input tend to be alike (up to a bound, so that one large file does not
+  // make every small one after it large).
+  size_t lastLines = 0, lastOutcomes = 0;
+
   // The record read so far is complete: its out-of-order lines go in place.
   void endRecord() {
-    if (current) current->settle();
+    if (current) {
+      current->settle();
+      lastLines = std::min<size_t>(current->lines.size(), 1024);
+      lastOutcomes = std::min<size_t>(current->branches.outcomeCount(), 1024);
+    }
     current = nullptr;
+  }
+
+  void startRecord(ImportedFile& file) {
+    current = &file;
+    if (file.lines.empty()) file.lines.reserve(lastLines);
+    if (file.branches.empty()) file.branches.reserve(lastOutcomes);
   }
 
   bool fail(const std::string& message) {
@@ -132,8 +148,8 @@ struct Parser {
       if (p < end && *p == '-') ++p;
       else if (!digits(p, end, taken)) return false;
       if (p == end || *p != '\n') return false;
-      current->addBranch(static_cast<std::uint32_t>(a),
-                         BranchKey{std::string(block, blockEnd), std::string(branch, branchEnd)}, taken);
+      current->branches.add(static_cast<std::uint32_t>(a), std::string_view(block, static_cast<size_t>(blockEnd - block)),
+                            std::string_view(branch, static_cast<size_t>(branchEnd - branch)), taken);
       next = p + 1;
       return true;
     }
@@ -188,7 +204,7 @@ struct Parser {
         base = sourceBaseDirectory(data.baseDirectory);
         baseKnown = true;
       }
-      current = &data.file(normalisedSourcePath(path, path[0] == '/' ? data.baseDirectory : base));
+      startRecord(data.file(normalisedSourcePath(path, path[0] == '/' ? data.baseDirectory : base)));
       ranges.clear();
       return true;
     }
@@ -270,9 +286,7 @@ struct Parser {
       if (c2 == std::string_view::npos || c3 <= c2 || !lineNumber(value.substr(0, c1), ln) || ln == 0 ||
           (value.substr(c3 + 1) != "-" && !count(value.substr(c3 + 1), taken)))
         return fail("malformed BRDA record '" + std::string(value) + "'");
-      current->addBranch(ln, BranchKey{std::string(value.substr(c1 + 1, c2 - c1 - 1)),
-                                       std::string(value.substr(c2 + 1, c3 - c2 - 1))},
-                         taken);
+      current->branches.add(ln, value.substr(c1 + 1, c2 - c1 - 1), value.substr(c2 + 1, c3 - c2 - 1), taken);
       return true;
     }
     // Test names, summaries, version and other records (and the records newer tools add)

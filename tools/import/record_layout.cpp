@@ -37,10 +37,10 @@ LaidOutRecord layOutRecord(const ImportedFile& file) {
   size_t i = 0;
   for (const auto& [line, hits] : file.lines) {
     LaidOutLine l{line, saturatedCount(hits), {}};
-    while (b != branchesEnd && b->first.line < line) ++b;
+    while (b != branchesEnd && b->line < line) ++b;
     // A branch taken more often than its line ran (possible only in odd or merged data)
     // would raise the line's count; nor can a line that never ran have taken a branch.
-    for (; b != branchesEnd && b->first.line == line; ++b) l.branches.push_back(std::min(saturatedCount(b->second), l.hits));
+    for (; b != branchesEnd && b->line == line; ++b) l.branches.push_back(std::min(saturatedCount(b->taken), l.hits));
     std::uint32_t owner = plan.owner[i++];
     if (owner < plan.functions.size()) rec.functions[owner].lines.push_back(std::move(l));
     else fileScope.push_back(std::move(l));
