@@ -6,11 +6,16 @@
 #include <cstring>
 #include <memory>
 #include <new>
+#include <string>
 #include <string_view>
+#include <system_error>
+#include <thread>
+#include <vector>
 
 #include "coverage/adjustment_list.h"
 #include "coverage/summary_build.h"
 #include "support/atomic_write.h"
+#include "support/message_sink.h"
 
 namespace {
 
@@ -71,6 +76,8 @@ std::uint32_t saturate(std::uint32_t v) { return v > kSaturation ? kSaturation :
 class GuardedWriter {
  public:
   explicit GuardedWriter(FILE* stream) : stream_(stream), buf_(new char[kSize]) { errno = 0; }
+  // Into memory: what is written is appended to `text`.
+  explicit GuardedWriter(std::string* text) : stream_(nullptr), memory_(text), buf_(new char[kSize]) {}
 
   GuardedWriter& text(std::string_view s) {
     if (s.size() > kSize - used_) {
@@ -152,7 +159,7 @@ class GuardedWriter {
 
   ErrorCode finish() {
     flush();
-    if (!failed_ && std::fflush(stream_) != 0) fail();
+    if (!failed_ && stream_ && std::fflush(stream_) != 0) fail();
     if (!failed_) return allOK;
     if (savedErrno_ == EPIPE) {
       clearPendingSystemError();
@@ -174,6 +181,10 @@ class GuardedWriter {
   }
   void writeOut(const char* data, std::size_t n) {
     if (failed_ || n == 0) return;
+    if (memory_) {
+      memory_->append(data, n);
+      return;
+    }
     if (std::fwrite(data, 1, n, stream_) != n) fail();
   }
   void fail() {
@@ -183,6 +194,7 @@ class GuardedWriter {
   }
 
   FILE* stream_;
+  std::string* memory_ = nullptr;
   std::unique_ptr<char[]> buf_;
   std::size_t used_ = 0;
   bool failed_ = false;
@@ -265,8 +277,110 @@ ErrorCode writeExport(FILE* stream, const SumRoot& root, MessageSink& messages) 
 
 namespace {
 
+void writeDirStart(GuardedWriter& w, const SumDir& d) {
+  const SumCounts& c = d.counts;
+  w.lit("di\t").name(d.name).tab().number(c.unusedBlocks).tab().number(c.blocks);
+  w.tab().number(c.adjUnusedLines).tab().number(c.adjLines).tab().number(d.unusedFuncs);
+  w.tab().number(d.funcs).tab().number(d.files);
+  w.endLine();
+}
+
+void writeFile(GuardedWriter& w, const SumFile& f, LazyLineStates& lineStates) {
+  const SumCounts& fc = f.counts;
+  w.lit("fi\t").name(f.name).tab().number(fc.unusedBlocks).tab().number(fc.blocks);
+  w.tab().number(fc.adjUnusedLines).tab().number(fc.adjLines).tab().number(f.unusedFuncs);
+  w.tab().number(f.funcs).tab().number(saturate(f.sessions));
+  w.endLine();
+  const LineStates& states = lineStates.of(f);
+  for (const SumFunc* fn : f.funcOrder) writeFunction(w, f, states, *fn);
+  w.lit("efi\t").name(f.name).endLine();
+}
+
+// One step of the report: a directory's first line, a file, or a directory's last line.
+struct ReportStep {
+  const SumDir* dir;
+  const SumFile* file;  // null: the directory's "di" line (start) or "edi" line
+  bool start;
+};
+
+void writeStep(GuardedWriter& w, const ReportStep& s, LazyLineStates& lineStates) {
+  if (s.file) {
+    writeFile(w, *s.file, lineStates);
+  } else if (s.start) {
+    writeDirStart(w, *s.dir);
+  } else {
+    w.lit("edi\t").name(s.dir->name).endLine();
+  }
+}
+
+std::size_t stepWeight(const ReportStep& s) {
+  return s.file && s.file->record ? s.file->record->map.size() + 1 : 1;
+}
+
+// The report's steps after the total are formatted on a few threads, a stretch of about
+// this many map entries at a time, each thread's part in memory, and written in order.
+constexpr std::size_t kEntriesPerStretch = std::size_t(1) << 20;
+
+ErrorCode writeStepsInParallel(GuardedWriter& w, const std::vector<ReportStep>& steps, const SumRoot& root,
+                               MessageSink& messages) {
+  const unsigned threads = std::max(1u, std::min(4u, std::thread::hardware_concurrency()));
+  std::vector<std::string> parts(threads);
+  std::vector<MessageList> notices(threads);
+  std::vector<std::unique_ptr<LazyLineStates>> lineStates;
+  for (unsigned t = 0; t < threads; ++t)
+    lineStates.push_back(std::make_unique<LazyLineStates>(adjustmentList(), root.hitsPolicy, notices[t]));
+  std::vector<char> failed(threads, 0);
+  std::size_t from = 0;
+  while (from < steps.size() && !w.failed()) {
+    // The stretch, cut into one contiguous part per thread of about equal weight.
+    std::size_t to = from, weight = 0;
+    while (to < steps.size() && weight < kEntriesPerStretch) weight += stepWeight(steps[to++]);
+    std::vector<std::size_t> cuts{from};
+    std::size_t seen = 0;
+    for (std::size_t k = from; k < to && cuts.size() < threads; ++k) {
+      seen += stepWeight(steps[k]);
+      if (seen >= weight / threads * cuts.size()) cuts.push_back(k + 1);
+    }
+    while (cuts.size() <= threads) cuts.push_back(to);
+    cuts.back() = to;
+    auto format = [&](unsigned t) {
+      try {
+        parts[t].clear();
+        GuardedWriter part(&parts[t]);
+        for (std::size_t k = cuts[t]; k < cuts[t + 1]; ++k) writeStep(part, steps[k], *lineStates[t]);
+        part.finish();
+      } catch (...) {
+        failed[t] = 1;
+      }
+    };
+    std::vector<std::thread> workers;
+    for (unsigned t = 1; t < threads; ++t) {
+      try {
+        workers.emplace_back(format, t);
+      } catch (const std::system_error&) {
+        format(t);  // no thread to be had: formatted here
+      }
+    }
+    format(0);
+    for (std::thread& t : workers) t.join();
+    for (unsigned t = 0; t < threads; ++t) {
+      if (failed[t]) throw std::bad_alloc();
+      for (const MessageList::Message& m : notices[t].messages) {
+        if (m.warning) {
+          messages.warning(m.text);
+        } else {
+          messages.notice(m.text);
+        }
+      }
+      notices[t].messages.clear();
+      w.text(parts[t]);
+    }
+    from = to;
+  }
+  return allOK;
+}
+
 ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when, MessageSink& messages) {
-  LazyLineStates lineStates(adjustmentList(), root.hitsPolicy, messages);
   GuardedWriter w(stream);
   writeHeader(w, when);
   const SumCounts& t = root.counts;
@@ -274,25 +388,24 @@ ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when, Messa
   w.tab().number(t.adjLines).tab().number(root.unusedFuncs).tab().number(root.funcs);
   w.tab().number(root.files).tab().number(root.dirs);
   w.endLine();
+  std::vector<ReportStep> steps;
+  std::size_t entries = 0;
   for (const SumDir* d : root.dirOrder) {
-    if (w.failed()) break;
-    const SumCounts& c = d->counts;
-    w.lit("di\t").name(d->name).tab().number(c.unusedBlocks).tab().number(c.blocks);
-    w.tab().number(c.adjUnusedLines).tab().number(c.adjLines).tab().number(d->unusedFuncs);
-    w.tab().number(d->funcs).tab().number(d->files);
-    w.endLine();
+    steps.push_back(ReportStep{d, nullptr, true});
     for (const SumFile* f : d->fileOrder) {
-      if (w.failed()) break;
-      const SumCounts& fc = f->counts;
-      w.lit("fi\t").name(f->name).tab().number(fc.unusedBlocks).tab().number(fc.blocks);
-      w.tab().number(fc.adjUnusedLines).tab().number(fc.adjLines).tab().number(f->unusedFuncs);
-      w.tab().number(f->funcs).tab().number(saturate(f->sessions));
-      w.endLine();
-      const LineStates& states = lineStates.of(*f);
-      for (const SumFunc* fn : f->funcOrder) writeFunction(w, *f, states, *fn);
-      w.lit("efi\t").name(f->name).endLine();
+      steps.push_back(ReportStep{d, f, false});
+      entries += stepWeight(steps.back());
     }
-    w.lit("edi\t").name(d->name).endLine();
+    steps.push_back(ReportStep{d, nullptr, false});
+  }
+  if (entries >= summaryThreadThreshold() && std::thread::hardware_concurrency() > 1) {
+    writeStepsInParallel(w, steps, root, messages);
+  } else {
+    LazyLineStates lineStates(adjustmentList(), root.hitsPolicy, messages);
+    for (const ReportStep& s : steps) {
+      if (w.failed()) break;
+      writeStep(w, s, lineStates);
+    }
   }
   return w.finish();
 }

@@ -564,6 +564,8 @@ ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPo
 
 }  // namespace
 
+std::size_t summaryThreadThreshold() { return gEntriesForThreads; }
+
 void setSummaryThreadThreshold(std::size_t mapEntries) {
   gEntriesForThreads = mapEntries;
   // A function's sort costs about what counting sixteen of its entries does.

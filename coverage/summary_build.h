@@ -45,6 +45,7 @@ ErrorCode buildSummary(KgvData& data, std::uint32_t sortOrder, std::uint32_t hit
 // Data with at least this many map entries in all are counted on several threads (the
 // default is a few million; tests set 0 to have every summary counted so).
 void setSummaryThreadThreshold(std::size_t mapEntries);
+std::size_t summaryThreadThreshold();
 
 // Counts again over an existing tree (after the adjustments changed), and line states where
 // the tree keeps them; the records, names and order stay.

@@ -521,6 +521,20 @@ std::unique_ptr<ObjRecord> randomRecord(std::mt19937& rng, int n) {
   return r;
 }
 
+// The export report of a tree, as of a fixed time.
+std::string exportText(const SumRoot& root) {
+  char* text = nullptr;
+  std::size_t size = 0;
+  FILE* out = open_memstream(&text, &size);
+  EXPECT_NE(out, nullptr);
+  if (!out) return "";
+  EXPECT_EQ(writeExport(out, root, 1700000000, gMessages), allOK);
+  fclose(out);
+  std::string s(text, size);
+  free(text);
+  return s;
+}
+
 // "" when both trees have the same counts in every row, else where they differ.
 std::string sameFigures(const SumRoot& a, const SumRoot& b) {
   auto same = [](const SumCounts& x, const SumCounts& y) {
@@ -614,6 +628,12 @@ TEST(SummaryTree, DamagedMapsGiveCorruptDataOrATreeButNeverACrash) {
       ASSERT_EQ(recomputeSummary(*lazy, hitsMax, adj, gMessages), allOK);
       for (const SumDir& d : lazy->dirRecords)
         for (const SumFile& f : d.fileRecords) ASSERT_TRUE(f.lineStates.empty());
+      // Formatted on several threads, the report is the same text.
+      const std::string serial = exportText(*again);
+      setSummaryThreadThreshold(0);
+      const std::string parallel = exportText(*again);
+      setSummaryThreadThreshold(std::size_t(4) << 20);
+      ASSERT_EQ(serial, parallel);
       FILE* sink = fopen("/dev/null", "w");
       ASSERT_NE(sink, nullptr);
       EXPECT_EQ(writeExport(sink, *again, gMessages), allOK);
