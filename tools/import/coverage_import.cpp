@@ -124,6 +124,13 @@ void nameFewFunctions(ImportedFile& file) {
 }
 
 void nameFileFunctions(ImportedFile& file) {
+  // No C++ names: each is shown as it is, and keys differ, so names do.
+  if (std::none_of(file.functions.begin(), file.functions.end(),
+                   [](const ImportedFunction& f) { return f.key.compare(0, 2, "_Z") == 0; })) {
+    for (ImportedFunction& f : file.functions) f.name = f.key;
+    file.namesDue = false;
+    return;
+  }
   if (file.functions.size() <= 32) return nameFewFunctions(file);
   std::vector<std::string> base;
   base.reserve(file.functions.size());
@@ -290,12 +297,61 @@ std::string demangledName(const std::string& key) {
   return shown;
 }
 
+size_t PathIndex::slotOf(std::string_view name, std::uint64_t hash) const {
+  size_t mask = slots_.size() - 1;
+  for (size_t i = hash & mask;; i = (i + 1) & mask) {
+    const Slot& s = slots_[i];
+    if (s.value == kEmpty) return i;
+    if (s.hash == hash && s.length == name.size() && std::string_view(bytes_.data() + s.offset, s.length) == name)
+      return i;
+  }
+}
+
+void PathIndex::grow(size_t slots) {
+  std::vector<Slot> old(slots, Slot());
+  old.swap(slots_);
+  for (const Slot& s : old) {
+    if (s.value == kEmpty) continue;
+    size_t mask = slots_.size() - 1;
+    size_t i = s.hash & mask;
+    while (slots_[i].value != kEmpty) i = (i + 1) & mask;
+    slots_[i] = s;
+  }
+}
+
+void PathIndex::reserve(size_t n) {
+  size_t want = 16;
+  while (want < 2 * n) want *= 2;
+  if (want > slots_.size()) grow(want);
+}
+
+PathIndex::iterator PathIndex::find(std::string_view name) const {
+  if (slots_.empty()) return end();
+  const Slot& s = slots_[slotOf(name, std::hash<std::string_view>()(name))];
+  if (s.value == kEmpty) return end();
+  return iterator(Entry{std::string_view(bytes_.data() + s.offset, s.length), s.value});
+}
+
+bool PathIndex::emplace(std::string_view name, size_t value) {
+  if (2 * (size_ + 1) > slots_.size()) grow(slots_.empty() ? 16 : 2 * slots_.size());
+  std::uint64_t hash = std::hash<std::string_view>()(name);
+  Slot& s = slots_[slotOf(name, hash)];
+  if (s.value != kEmpty) return false;
+  s.hash = hash;
+  s.offset = bytes_.size();
+  s.length = static_cast<std::uint32_t>(name.size());
+  s.value = static_cast<std::uint32_t>(value);
+  bytes_.append(name);
+  ++size_;
+  return true;
+}
+
 ImportedFile& ImportedData::file(std::string path) {
   auto it = fileIndex.find(path);
   if (it != fileIndex.end()) return files[it->second];
+  fileIndex.emplace(path, files.size());
   files.emplace_back();
-  files.back().path = path;
-  fileIndex.emplace(std::move(path), files.size() - 1);
+  files.back().path = std::move(path);
   return files.back();
 }
 
@@ -413,21 +469,24 @@ PlainRead readPlainFile(const std::string& path, std::string& text, ImportError&
   // Room for one byte more than the size, so that reaching the end needs no second buffer.
   text.resize(static_cast<size_t>(st.st_size) + 1);
   size_t have = 0;
+  int failure = 0;
   for (;;) {
-    if (have == text.size()) text.resize(text.size() * 2);
-    ssize_t n = read(fd, text.data() + have, text.size() - have);
-    if (n < 0 && errno == EINTR) continue;
-    if (n < 0) {
-      error.message = std::string("cannot read: ") + strerror(errno);
-      close(fd);
-      text.clear();
-      return PlainRead::failed;
+    if (have == text.size()) text.resize(2 * text.size());  // it grew while it was read
+    ssize_t got = read(fd, text.data() + have, text.size() - have);
+    if (got < 0 && errno == EINTR) continue;
+    if (got <= 0) {
+      failure = got < 0 ? errno : 0;
+      break;
     }
-    if (n == 0) break;
-    have += static_cast<size_t>(n);
+    have += static_cast<size_t>(got);
   }
-  close(fd);
   text.resize(have);
+  close(fd);
+  if (failure != 0) {
+    error.message = std::string("cannot read: ") + strerror(failure);
+    text.clear();
+    return PlainRead::failed;
+  }
   return PlainRead::read;
 }
 

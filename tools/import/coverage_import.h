@@ -310,6 +310,56 @@ struct StringViewHash {
 
 using NameIndex = std::unordered_map<std::string, size_t, StringViewHash, std::equal_to<>>;
 
+// Names to numbers (source paths to their place in ImportedData::files): an open-addressed
+// table over one string of the names end to end, so that a name added costs no allocation
+// of its own. Read as a map: find() gives an iterator to (name, number), valid until the
+// next name is added.
+class PathIndex {
+ public:
+  struct Entry {
+    std::string_view first;
+    size_t second;
+  };
+  class iterator {
+   public:
+    iterator() = default;
+    explicit iterator(Entry e) : entry_(e), valid_(true) {}
+    const Entry& operator*() const { return entry_; }
+    const Entry* operator->() const { return &entry_; }
+    bool operator==(const iterator& o) const {
+      return valid_ == o.valid_ && (!valid_ || entry_.second == o.entry_.second);
+    }
+    bool operator!=(const iterator& o) const { return !(*this == o); }
+
+   private:
+    Entry entry_{};
+    bool valid_ = false;
+  };
+
+  iterator find(std::string_view name) const;
+  iterator end() const { return iterator(); }
+  size_t size() const { return size_; }
+  bool empty() const { return size_ == 0; }
+  // Adds the name unless it is there; false if it was.
+  bool emplace(std::string_view name, size_t value);
+  void reserve(size_t n);
+
+ private:
+  struct Slot {
+    std::uint64_t hash = 0;
+    size_t offset = 0;  // of the name in bytes_
+    std::uint32_t length = 0;
+    std::uint32_t value = kEmpty;
+  };
+  static constexpr std::uint32_t kEmpty = UINT32_MAX;
+  size_t slotOf(std::string_view name, std::uint64_t hash) const;
+  void grow(size_t slots);
+
+  std::vector<Slot> slots_;  // a power of two of them, at most half in use
+  std::string bytes_;
+  size_t size_ = 0;
+};
+
 struct ImportedFile {
   std::string path;
   std::vector<ImportedFunction> functions;  // in order of first appearance
@@ -341,7 +391,7 @@ struct ImportedFile {
 
 struct ImportedData {
   std::vector<ImportedFile> files;  // in order of first appearance
-  NameIndex fileIndex;
+  PathIndex fileIndex;
   // Where relative source paths of tracefiles (and of gcov JSON that names no working
   // directory) are taken from; empty: the current directory.
   std::string baseDirectory;

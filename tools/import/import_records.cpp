@@ -19,8 +19,8 @@ class StringArea {
   std::uint32_t add(std::string_view name) {
     // A record names its file and a few functions: a scan finds them sooner than a hash.
     if (offsets_.empty()) {
-      for (const auto& [known, offset] : few_)
-        if (known == name) return offset;
+      for (size_t i = 0; i < fewCount_; ++i)
+        if (fewSpace_[i].first == name) return fewSpace_[i].second;
     } else {
       auto it = offsets_.find(name);
       if (it != offsets_.end()) return it->second;
@@ -28,14 +28,12 @@ class StringArea {
     auto offset = static_cast<std::uint32_t>(bytes_.size());
     bytes_.insert(bytes_.end(), name.begin(), name.end());
     bytes_.push_back('\0');
-    if (!offsets_.empty()) {
-      offsets_.emplace(name, offset);
+    if (offsets_.empty() && fewCount_ < std::size(fewSpace_)) {
+      fewSpace_[fewCount_++] = {name, offset};
     } else {
-      few_.emplace_back(name, offset);
-      if (few_.size() > 16) {
-        for (const auto& [known, at] : few_) offsets_.emplace(known, at);
-        few_.clear();
-      }
+      for (size_t i = 0; i < fewCount_; ++i) offsets_.emplace(fewSpace_[i].first, fewSpace_[i].second);
+      fewCount_ = 0;
+      offsets_.emplace(name, offset);
     }
     return offset;
   }
@@ -47,7 +45,8 @@ class StringArea {
 
  private:
   std::vector<char> bytes_;
-  std::vector<std::pair<std::string_view, std::uint32_t>> few_;
+  std::pair<std::string_view, std::uint32_t> fewSpace_[16];
+  size_t fewCount_ = 0;
   std::unordered_map<std::string_view, std::uint32_t> offsets_;
 };
 
@@ -222,11 +221,25 @@ std::unique_ptr<KgvData> makeImportedData(const ImportedData& data, std::uint32_
   auto d = std::make_unique<KgvData>();
   d->records.reserve(data.files.size());
   LayoutPlan plan;
+  // Folders found missing: none of their files need looking for (inputs from another
+  // machine name thousands of sources in a few hundred folders that are not here).
+  std::unordered_map<std::string_view, bool> folderMissing;
+  struct stat folderStat;
   for (const auto& file : data.files) {
     planLayout(file, plan);
     // The signature says which source the data are of: its content, so that captures of an
     // unchanged source merge as one version whatever lines each holds.
-    SourceFacts src = sourceFacts(file.path);
+    SourceFacts src;
+    size_t slash = file.path.rfind('/');
+    bool missing = false;
+    if (slash != std::string::npos && slash > 0) {
+      std::string_view folder(file.path.data(), slash);
+      auto [it, added] = folderMissing.emplace(folder, false);
+      // Where the folder cannot be reached, neither can anything in it.
+      if (added) it->second = stat(std::string(folder).c_str(), &folderStat) != 0;
+      missing = it->second;
+    }
+    if (!missing) src = sourceFacts(file.path);
     std::uint32_t signature = src.readable ? src.signature : lineSetSignature(file);
     // The build is taken to be a second after the source was last written: the source
     // window counts a source whose time is at or after the build's as changed since.

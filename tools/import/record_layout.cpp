@@ -8,10 +8,7 @@ const char* const kFileScopeName = "(file scope)";
 
 namespace {
 
-struct Range {
-  std::uint32_t start, end;  // end inclusive
-  size_t function;           // index into the laid-out functions: the group's owner
-};
+using Range = LayoutPlan::Range;
 
 std::uint32_t fnv1a(std::uint32_t h, const void* data, size_t n) {
   const unsigned char* p = static_cast<const unsigned char*>(data);
@@ -67,7 +64,8 @@ void planLayout(const ImportedFile& file, LayoutPlan& plan) {
   // One range per group of functions starting on one line. Known ends are used as they
   // are; otherwise the group reaches to the line before the next function that starts
   // later (or to the end of the file).
-  std::vector<Range> ranges;
+  std::vector<Range>& ranges = plan.ranges;
+  ranges.clear();
   for (size_t i = 0; i < funcs.size();) {
     std::uint32_t start = funcs[i]->startLine;
     size_t j = i;
@@ -99,7 +97,8 @@ void planLayout(const ImportedFile& file, LayoutPlan& plan) {
   plan.fileScopeFirst = 0;
   plan.fileScopeRan = false;
   const auto outside = static_cast<std::uint32_t>(funcs.size());
-  std::vector<const Range*> open;
+  std::vector<const Range*>& open = plan.open;
+  open.clear();
   size_t next = 0;
   for (const auto& [line, hits] : file.lines) {
     while (next < ranges.size() && ranges[next].start <= line) open.push_back(&ranges[next++]);

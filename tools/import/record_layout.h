@@ -47,6 +47,14 @@ struct LayoutPlan {
   size_t fileScopeLines = 0;
   std::uint32_t fileScopeFirst = 0;
   bool fileScopeRan = false;  // any line outside every function ran
+
+  // Room reused from file to file.
+  struct Range {
+    std::uint32_t start, end;  // end inclusive
+    size_t function;           // index into functions: the group's owner
+  };
+  std::vector<Range> ranges;
+  std::vector<const Range*> open;
 };
 void planLayout(const ImportedFile& file, LayoutPlan& plan);
 
