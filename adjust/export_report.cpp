@@ -317,6 +317,8 @@ std::size_t stepWeight(const ReportStep& s) {
   return s.file && s.file->record ? s.file->record->map.size() + 1 : 1;
 }
 
+// Line states for the report need no classes: only flags and counts are written.
+
 // The report's steps after the total are formatted on a few threads, a stretch of about
 // this many map entries at a time, each thread's part in memory, and written in order.
 constexpr std::size_t kEntriesPerStretch = std::size_t(1) << 20;
@@ -328,7 +330,7 @@ ErrorCode writeStepsInParallel(GuardedWriter& w, const std::vector<ReportStep>& 
   std::vector<MessageList> notices(threads);
   std::vector<std::unique_ptr<LazyLineStates>> lineStates;
   for (unsigned t = 0; t < threads; ++t)
-    lineStates.push_back(std::make_unique<LazyLineStates>(adjustmentList(), root.hitsPolicy, notices[t]));
+    lineStates.push_back(std::make_unique<LazyLineStates>(adjustmentList(), root.hitsPolicy, notices[t], false));
   std::vector<char> failed(threads, 0);
   std::size_t from = 0;
   while (from < steps.size() && !w.failed()) {
@@ -401,7 +403,7 @@ ErrorCode writeReport(FILE* stream, const SumRoot& root, std::time_t when, Messa
   if (entries >= summaryThreadThreshold() && std::thread::hardware_concurrency() > 1) {
     writeStepsInParallel(w, steps, root, messages);
   } else {
-    LazyLineStates lineStates(adjustmentList(), root.hitsPolicy, messages);
+    LazyLineStates lineStates(adjustmentList(), root.hitsPolicy, messages, false);
     for (const ReportStep& s : steps) {
       if (w.failed()) break;
       writeStep(w, s, lineStates);

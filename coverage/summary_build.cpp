@@ -277,7 +277,7 @@ ErrorCode FileCounter::run() {
 }
 
 void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
-                     MessageSink& messages, LineStates& states) {
+                     MessageSink& messages, LineStates& states, bool withClasses = true) {
   if (f.lineCount == 0 || !f.record) {
     states.clear();
     return;
@@ -342,7 +342,7 @@ void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet*
   mark(last, LineFuncEnd);
   // Lines without code keep their adjustment bits too; a segment's lines share theirs.
   if (set) states.forEachSegment([&](std::uint32_t first, std::uint32_t, LineState& s) { s.flags |= set->lineKinds(first); });
-  states.classify();
+  if (withClasses) states.classify();
 }
 
 void addTimes(std::uint32_t& first, std::uint32_t& last, std::uint32_t f, std::uint32_t l) {
@@ -667,14 +667,15 @@ struct LazyLineStates::Index {
 };
 
 LazyLineStates::LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy,
-                               MessageSink& messages)
-    : index_(std::make_unique<Index>(adjustments)), policy_(hitsPolicy), messages_(messages) {}
+                               MessageSink& messages, bool withClasses)
+    : index_(std::make_unique<Index>(adjustments)), policy_(hitsPolicy), messages_(messages),
+      withClasses_(withClasses) {}
 
 LazyLineStates::~LazyLineStates() = default;
 
 const LineStates& LazyLineStates::of(const SumFile& file) {
   if (file.lineCount == 0 || !file.lineStates.empty() || !file.dir || !file.record)
     return file.lineStates;
-  buildLineStates(file, policy_, index_->sets.find(*file.dir, file), messages_, scratch_);
+  buildLineStates(file, policy_, index_->sets.find(*file.dir, file), messages_, scratch_, withClasses_);
   return scratch_;
 }

@@ -65,8 +65,9 @@ SumFile* findSumFile(SumRoot& root, const std::string& path);
 // adjustment list must not change while this lives.
 class LazyLineStates {
  public:
+  // Without classes, states made here carry flags and counts only (a report needs no more).
   LazyLineStates(const AdjustmentList& adjustments, std::uint32_t hitsPolicy,
-                 MessageSink& messages);
+                 MessageSink& messages, bool withClasses = true);
   ~LazyLineStates();
   LazyLineStates(const LazyLineStates&) = delete;
   LazyLineStates& operator=(const LazyLineStates&) = delete;
@@ -78,5 +79,6 @@ class LazyLineStates {
   std::unique_ptr<Index> index_;
   std::uint32_t policy_;
   MessageSink& messages_;
+  bool withClasses_;
   LineStates scratch_;
 };
