@@ -3,6 +3,7 @@
 #include "coverage/summary_build.h"
 
 #include <algorithm>
+#include <atomic>
 #include <cstdlib>
 #include <new>
 #include <string_view>
@@ -470,6 +471,23 @@ std::uint32_t getHitsPolicy() {
 
 namespace {
 
+void listFunctions(SumFile& f) {
+  const std::vector<std::uint32_t>& map = f.record->map;
+  std::uint32_t n = 0;
+  for (std::uint32_t e : map) n += mapTag(e) == TagFunction;
+  f.funcs = n;
+  f.functions.resize(n);
+  std::uint32_t k = 0;
+  for (std::size_t i = 0; i < map.size(); ++i) {
+    if (mapTag(map[i]) != TagFunction) continue;
+    SumFunc& fn = f.functions[k++];
+    fn.nativeIndex = static_cast<std::uint32_t>(i);
+    fn.name = f.record->nameAt(mapValue(map[i]));
+  }
+  f.funcOrder.reserve(n);
+  for (SumFunc& fn : f.functions) f.funcOrder.push_back(&fn);
+}
+
 ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPolicy,
                     const AdjustmentList& adjustments, MessageSink& messages,
                     std::unique_ptr<SumRoot>& out, bool withLineStates) {
@@ -534,25 +552,22 @@ ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPo
     f.record = &rec;
   }
 
-  // Functions: one per TagFunction entry, in map order.
-  for (SumDir& d : root->dirRecords) {
-    for (SumFile& f : d.fileRecords) {
-      const std::vector<std::uint32_t>& map = f.record->map;
-      std::uint32_t n = 0;
-      for (std::uint32_t e : map) n += mapTag(e) == TagFunction;
-      f.funcs = n;
-      f.functions.resize(n);
-      std::uint32_t k = 0;
-      for (std::size_t i = 0; i < map.size(); ++i) {
-        if (mapTag(map[i]) != TagFunction) continue;
-        SumFunc& fn = f.functions[k++];
-        fn.nativeIndex = static_cast<std::uint32_t>(i);
-        fn.name = f.record->nameAt(mapValue(map[i]));
-      }
-      f.funcOrder.reserve(n);
-      for (SumFunc& fn : f.functions) f.funcOrder.push_back(&fn);
-    }
-  }
+  // Functions: one per TagFunction entry, in map order; files apart, so on a few threads
+  // for large data.
+  std::vector<SumFile*> files;
+  for (SumDir& d : root->dirRecords)
+    for (SumFile& f : d.fileRecords) files.push_back(&f);
+  std::atomic<bool> noRoom{false};
+  runInParallel(
+      files.size(), [&](std::size_t k) { return files[k]->record->map.size(); }, gEntriesForThreads,
+      [&](std::size_t from, std::size_t to) {
+        try {
+          for (std::size_t r = from; r < to; ++r) listFunctions(*files[r]);
+        } catch (const std::bad_alloc&) {
+          noRoom = true;
+        }
+      });
+  if (noRoom) return outOfMemory;
 
   root->lineStatesKept = withLineStates;
   rc = computeStatistics(*root, hitsPolicy, AdjustIndex(adjustments), messages, withLineStates);
