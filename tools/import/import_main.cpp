@@ -161,7 +161,7 @@ int main(int argc, char** argv) {
   if (data.files.empty()) return fail("the inputs hold no coverage data");
 
   auto now = static_cast<std::uint32_t>(time(nullptr));
-  auto kgv = makeImportedData(data, now);
+  auto kgv = makeImportedDataReleasing(data, now);
   // Other programs may be reading or merging into the same file: write under its lock.
   ErrorCode rc = lockKgvFile(out);
   if (rc == allOK) {

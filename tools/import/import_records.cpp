@@ -217,7 +217,11 @@ std::unique_ptr<ObjRecord> makeFileRecord(const ImportedFile& file, const Layout
 
 }  // namespace
 
-std::unique_ptr<KgvData> makeImportedData(const ImportedData& data, std::uint32_t importTime) {
+namespace {
+
+// `consume`: each file's data are let go once its record is made, so that the records
+// reuse their memory.
+std::unique_ptr<KgvData> makeRecords(const ImportedData& data, std::uint32_t importTime, ImportedData* consume) {
   auto d = std::make_unique<KgvData>();
   d->records.reserve(data.files.size());
   LayoutPlan plan;
@@ -245,8 +249,28 @@ std::unique_ptr<KgvData> makeImportedData(const ImportedData& data, std::uint32_
     // window counts a source whose time is at or after the build's as changed since.
     std::uint32_t build = src.exists ? src.mtime + 1 : importTime;
     d->records.push_back(makeFileRecord(file, plan, signature, build, importTime));
+    if (consume) {
+      // The folder names seen point into the paths: those stay.
+      ImportedFile& done = consume->files[d->records.size() - 1];
+      done.functions = {};
+      done.lines = {};
+      done.branches = {};
+      done.functionIndex = {};
+    }
   }
   d->header.recordCount = static_cast<std::uint32_t>(d->records.size());
   rebuildRecordSizes(*d);
+  return d;
+}
+
+}  // namespace
+
+std::unique_ptr<KgvData> makeImportedData(const ImportedData& data, std::uint32_t importTime) {
+  return makeRecords(data, importTime, nullptr);
+}
+
+std::unique_ptr<KgvData> makeImportedDataReleasing(ImportedData& data, std::uint32_t importTime) {
+  auto d = makeRecords(data, importTime, &data);
+  data = ImportedData();
   return d;
 }

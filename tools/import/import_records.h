@@ -16,3 +16,6 @@ std::unique_ptr<ObjRecord> makeImportedRecord(const LaidOutRecord& rec, std::uin
 
 // All files of the import, in order of first appearance.
 std::unique_ptr<KgvData> makeImportedData(const ImportedData& data, std::uint32_t importTime);
+// The same, letting go of `data` as it goes (it is left empty): the records take the
+// memory the files gave up, and the import's peak is lower.
+std::unique_ptr<KgvData> makeImportedDataReleasing(ImportedData& data, std::uint32_t importTime);
