@@ -121,11 +121,31 @@ struct Parser {
   }
 
   // The busiest records in their plain form (DA:n,n  BRDA:n,n,n,n|-  FN:n,name  FNDA:n,name,
-  // inside a record, with plain numbers and a whole line), read without splitting the line
-  // into views first. False, having changed nothing, for anything else: line() then reads
+  // inside a record, with plain numbers and a whole line; end_of_record; test names and
+  // summaries), read without splitting the line into views first. False, having changed nothing, for anything else: line() then reads
   // it, with its checks and messages.
   bool quick(const char* s, const char* end, size_t firstNul, const char* base, const char*& next) {
-    if (!current || end - s < 6) return false;
+    if (end - s < 6) return false;
+    // Test names and summaries carry nothing we keep.
+    size_t keyLength = s[0] == 'T' && s[1] == 'N' ? 2
+                       : s[0] == 'L' && (s[1] == 'F' || s[1] == 'H') ? 2
+                       : (s[0] == 'F' && s[1] == 'N' && (s[2] == 'F' || s[2] == 'H')) ||
+                                 (s[0] == 'B' && s[1] == 'R' && (s[2] == 'F' || s[2] == 'H'))
+                           ? 3
+                           : 0;
+    if (keyLength != 0 && s[keyLength] == ':') {
+      const char* lineEnd = static_cast<const char*>(memchr(s, '\n', static_cast<size_t>(end - s)));
+      if (!lineEnd || (firstNul != std::string::npos && firstNul < static_cast<size_t>(lineEnd - base))) return false;
+      next = lineEnd + 1;
+      return true;
+    }
+    if (!current) return false;
+    if (end - s >= 14 && memcmp(s, "end_of_record\n", 14) == 0) {
+      endRecord();
+      ranges.clear();
+      next = s + 14;
+      return true;
+    }
     const char* p;
     std::uint64_t a, b;
     if (s[0] == 'D' && s[1] == 'A' && s[2] == ':') {
