@@ -71,5 +71,5 @@ awk -v b="$bytes" -v ms="$merge_s" -v mk="$merge_kb" -v mc="$merge_cpu" -v es="$
     printf "  export: %6.2f s  (CPU %.2f s)  peak memory %.1f MB\n", es, ec, ek * 1024 / 1e6
     ratio = ms > 0 ? es / ms : 0
     printf "  export/merge time: %.2f (target <= 1.5)\n", ratio
-    printf "  report text: %.0f MB/s (target >= 300)\n", es > 0 ? rb / 1e6 / es : 0
+    printf "  report text: %.0f MB/s (target >= 300)\n", (es > 0 ? rb / 1e6 / es : 0)
   }'
