@@ -327,43 +327,18 @@ class FastReader {
       case '"':
         s.kind = Kind::string;
         return string(s.text);
-      case '{': {
+      case '{':
         if (depth >= kMaxDepth) return false;
-        ++p_;
-        if (!skipSpace()) return false;
-        if (*p_ == '}') {
-          ++p_;
-          return true;
-        }
-        for (;;) {
-          std::string_view key;
+        return object([&](std::string_view) {
           Scalar inner;
-          if (!string(key) || !expect(':') || !value(inner, depth + 1) || !skipSpace()) return false;
-          if (*p_ == '}') {
-            ++p_;
-            return true;
-          }
-          if (*p_++ != ',') return false;
-        }
-      }
-      case '[': {
+          return value(inner, depth + 1);
+        });
+      case '[':
         if (depth >= kMaxDepth) return false;
-        ++p_;
-        if (!skipSpace()) return false;
-        if (*p_ == ']') {
-          ++p_;
-          return true;
-        }
-        for (;;) {
+        return array([&] {
           Scalar inner;
-          if (!value(inner, depth + 1) || !skipSpace()) return false;
-          if (*p_ == ']') {
-            ++p_;
-            return true;
-          }
-          if (*p_++ != ',') return false;
-        }
-      }
+          return value(inner, depth + 1);
+        });
       case 't': return literal("true");
       case 'f': return literal("false");
       case 'n': return literal("null");
@@ -371,42 +346,35 @@ class FastReader {
     }
   }
 
-  // An object's members in turn: `member(key)` reads each value, true when all is well.
-  template <class Member>
-  bool object(Member member) {
-    if (!expect('{')) return false;
-    if (!skipSpace()) return false;
-    if (*p_ == '}') {
+  // The items of an object or array in turn, between `open` and `close`, comma-separated.
+  template <class Item>
+  bool sequence(char open, char close, Item item) {
+    if (!expect(open) || !skipSpace()) return false;
+    if (*p_ == close) {
       ++p_;
       return true;
     }
     for (;;) {
-      std::string_view key;
-      if (!string(key) || !expect(':') || !member(key) || !skipSpace()) return false;
-      if (*p_ == '}') {
+      if (!item() || !skipSpace()) return false;
+      if (*p_ == close) {
         ++p_;
         return true;
       }
       if (*p_++ != ',') return false;
     }
   }
+  // An object's members in turn: `member(key)` reads each value, true when all is well.
+  template <class Member>
+  bool object(Member member) {
+    return sequence('{', '}', [&] {
+      std::string_view key;
+      return string(key) && expect(':') && member(key);
+    });
+  }
   // An array's elements in turn.
   template <class Element>
   bool array(Element element) {
-    if (!expect('[')) return false;
-    if (!skipSpace()) return false;
-    if (*p_ == ']') {
-      ++p_;
-      return true;
-    }
-    for (;;) {
-      if (!element() || !skipSpace()) return false;
-      if (*p_ == ']') {
-        ++p_;
-        return true;
-      }
-      if (*p_++ != ',') return false;
-    }
+    return sequence('[', ']', element);
   }
   bool next(char c) { return skipSpace() && *p_ == c; }
   // Each key of ours once: the library keeps the last of a repeated key.
