@@ -12,7 +12,7 @@ if [ -z "${KG_BENCH_INNER:-}" ]; then
   KG_BENCH_INNER=1 exec "$HERE/../tools/xvfb-run-here.sh" "$0" "$@"
 fi
 WORK=$(mktemp -d /tmp/kg-source-bench.XXXXXX)
-trap 'kill "${pid:-0}" 2>/dev/null; rm -rf "$WORK"' EXIT
+trap 'kill "${pid:-0}" 2>/dev/null || true; rm -rf "$WORK"' EXIT
 
 SRC="$WORK/big.c"
 awk -v src="$SRC" -v kgv="$WORK/big.txt" 'BEGIN {

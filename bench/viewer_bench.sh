@@ -10,7 +10,7 @@ if [ -z "${KG_BENCH_INNER:-}" ]; then
   KG_BENCH_INNER=1 exec "$HERE/../tools/xvfb-run-here.sh" "$0" "$@"
 fi
 WORK=$(mktemp -d /tmp/kg-viewer-bench.XXXXXX)
-trap 'kill "${pid:-0}" 2>/dev/null; rm -rf "$WORK"' EXIT
+trap 'kill "${pid:-0}" 2>/dev/null || true; rm -rf "$WORK"' EXIT
 
 # 500 directories of 20 files: generated record K lives in directory K / 100.
 for ((d = 0; d < 500; d++)); do

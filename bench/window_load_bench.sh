@@ -14,7 +14,7 @@ TIME=/usr/bin/time
 [ -x "$TIME" ] || { echo "window_load_bench: /usr/bin/time is needed (Debian package 'time')"; exit 1; }
 if [ -z "${TMPDIR:-}" ] && [ -d /dev/shm ] && [ -w /dev/shm ]; then TMPDIR=/dev/shm; fi
 WORK=$(mktemp -d "${TMPDIR:-/tmp}/kg-window-bench.XXXXXX")
-trap 'kill "${pid:-0}" 2>/dev/null; rm -rf "$WORK"' EXIT
+trap 'kill "${pid:-0}" 2>/dev/null || true; rm -rf "$WORK"' EXIT
 
 # A record of 50 functions of 20 blocks takes about 7.6 KB.
 records=$((MB * 1000000 / 7600))

@@ -44,9 +44,10 @@ inline std::string shown(const std::string& s) {
 }
 
 // The scratch data file. A memory file system where there is one: every accepted input is
-// written, and the writer syncs the disk.
+// written, and the writer syncs the disk. The name is never destroyed, so that the exit
+// handler removing the file can still read it whatever the order of exit-time clean-up.
 inline const std::string& scratchKgv() {
-  static const std::string path = [] {
+  static const std::string* path = new std::string([] {
     struct stat st;
     const char* tmp = getenv("TMPDIR");
     std::string dir = stat("/dev/shm", &st) == 0 && S_ISDIR(st.st_mode) && access("/dev/shm", W_OK) == 0
@@ -57,8 +58,8 @@ inline const std::string& scratchKgv() {
     if (fd < 0) fail("cannot create a scratch file in " + dir);
     close(fd);
     return templ;
-  }();
-  return path;
+  }());
+  return *path;
 }
 
 inline void removeScratchKgv() { unlink(scratchKgv().c_str()); }
