@@ -30,11 +30,7 @@ class HelpMenu : public ::testing::Test {
   void SetUp() override {
     ASSERT_FALSE(server.display().empty()) << "Xvfb did not start";
     source = dir.file("prog.c");
-    writeFile(source, "int helper(int x) {\n  return x * 2;\n}\n");
-    struct timeval old[2] = {{time(nullptr) - 60, 0}, {time(nullptr) - 60, 0}};
-    utimes(source.c_str(), old);
-    const std::string run = "record " + source + " build=" + std::to_string(time(nullptr)) +
-                            "\nfunction helper line=1 calls=1\nblock 2 hits=3\n";
+    const std::string run = writeOneFunctionProgram(source);
     std::string error;
     ASSERT_TRUE(makeKgvFile(run, dir.file("p.kgv"), error)) << error;
     // The browser stands in for the user's: each run is one line of its arguments.

@@ -3,12 +3,14 @@
 
 #include <fcntl.h>
 #include <signal.h>
+#include <sys/time.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <cctype>
 #include <chrono>
 #include <cstdlib>
+#include <ctime>
 #include <sstream>
 #include <thread>
 
@@ -17,6 +19,14 @@ namespace kgtest {
 namespace {
 void sleepMs(int ms) { std::this_thread::sleep_for(std::chrono::milliseconds(ms)); }
 }  // namespace
+
+std::string writeOneFunctionProgram(const std::string& source) {
+  writeFile(source, "int helper(int x) {\n  return x * 2;\n}\n");
+  struct timeval old[2] = {{time(nullptr) - 60, 0}, {time(nullptr) - 60, 0}};
+  utimes(source.c_str(), old);
+  return "record " + source + " build=" + std::to_string(time(nullptr)) +
+         "\nfunction helper line=1 calls=1\nblock 2 hits=3\n";
+}
 
 std::string x11LeakSuppressions() {
   return "LSAN_OPTIONS=suppressions=" + sourceDir() + "/tests/lsan_x11.supp:print_suppressions=0";

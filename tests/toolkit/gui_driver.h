@@ -49,6 +49,9 @@ struct Screenshot {
 };
 
 // The environment setting that makes the sanitizer build ignore the X libraries' own caches.
+// Writes a one-function program to `source` (older than its data, so no "modified since
+// compiled" question comes) and gives the kgv-make description of a run of it.
+std::string writeOneFunctionProgram(const std::string& source);
 std::string x11LeakSuppressions();
 
 class GuiApp {

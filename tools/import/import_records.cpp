@@ -97,6 +97,18 @@ SourceFacts sourceFacts(const std::string& path) {
   return f;
 }
 
+// The string area and the header of a record whose map is complete; both builders end so.
+void finishRecord(ObjRecord& r, StringArea& strings, std::uint32_t signature, std::uint32_t buildTime,
+                  std::uint32_t importTime) {
+  r.strings = strings.take();
+  r.objHeader.signature = signature;
+  r.objHeader.buildTime = buildTime;
+  r.objHeader.firstTime = importTime;
+  r.objHeader.lastTime = importTime;
+  r.objHeader.stringWords = static_cast<std::uint32_t>(r.strings.size() / 4);
+  r.objHeader.mapCount = static_cast<std::uint32_t>(r.map.size());
+}
+
 }  // namespace
 
 std::unique_ptr<ObjRecord> makeImportedRecord(const LaidOutRecord& rec, std::uint32_t buildTime,
@@ -117,13 +129,7 @@ std::unique_ptr<ObjRecord> makeImportedRecord(const LaidOutRecord& rec, std::uin
       for (std::uint16_t taken : l.branches) push(TagBlock, l.line, taken);
     }
   }
-  r->strings = strings.take();
-  r->objHeader.signature = rec.signature;
-  r->objHeader.buildTime = buildTime;
-  r->objHeader.firstTime = importTime;
-  r->objHeader.lastTime = importTime;
-  r->objHeader.stringWords = static_cast<std::uint32_t>(r->strings.size() / 4);
-  r->objHeader.mapCount = static_cast<std::uint32_t>(r->map.size());
+  finishRecord(*r, strings, rec.signature, buildTime, importTime);
   return r;
 }
 
@@ -205,13 +211,7 @@ std::unique_ptr<ObjRecord> makeFileRecord(const ImportedFile& file, const Layout
     if (plan.fileScopeFirst != 0) push(TagFuncLine, plan.fileScopeFirst, 0);
     pushLines(nFuncs);
   }
-  r->strings = strings.take();
-  r->objHeader.signature = signature;
-  r->objHeader.buildTime = buildTime;
-  r->objHeader.firstTime = importTime;
-  r->objHeader.lastTime = importTime;
-  r->objHeader.stringWords = static_cast<std::uint32_t>(r->strings.size() / 4);
-  r->objHeader.mapCount = static_cast<std::uint32_t>(r->map.size());
+  finishRecord(*r, strings, signature, buildTime, importTime);
   return r;
 }
 
