@@ -2,7 +2,9 @@
 // write nothing more is written, and a closed pipe counts as success.
 #include "adjust/export_report.h"
 
+#include <algorithm>
 #include <cerrno>
+#include <charconv>
 #include <cstring>
 #include <memory>
 #include <new>
@@ -71,23 +73,45 @@ const char kDigitPairs[] =
 
 std::uint32_t saturate(std::uint32_t v) { return v > kSaturation ? kSaturation : v; }
 
+// The longest block or line record: key, a line number of ten digits, a count of five.
+constexpr std::ptrdiff_t kMaxRecordLine = 32;
+
+// Text formatted in memory, kept from use to use so that its storage is reused.
+struct TextPart {
+  std::unique_ptr<char[]> data;
+  std::size_t capacity = 0;
+  std::size_t size = 0;
+  std::string_view view() const { return std::string_view(data.get(), size); }
+};
+
 // Collects output in a buffer and hands it to the stream in large writes. The first failed
-// write sets the flag; everything after it is dropped.
+// write sets the flag; everything after it is dropped. Into memory, the buffer is the part
+// itself and grows instead.
 class GuardedWriter {
  public:
-  explicit GuardedWriter(FILE* stream) : stream_(stream), buf_(new char[kSize]) { errno = 0; }
-  // Into memory: what is written is appended to `text`.
-  explicit GuardedWriter(std::string* text) : stream_(nullptr), memory_(text), buf_(new char[kSize]) {}
+  explicit GuardedWriter(FILE* stream) : stream_(stream), own_(new char[kSize]), buf_(own_.get()), cap_(kSize) {
+    errno = 0;
+  }
+  explicit GuardedWriter(TextPart& part) : stream_(nullptr), part_(&part) {
+    part.size = 0;
+    if (part.capacity < kSize) {
+      part.data.reset(new char[kSize]);
+      part.capacity = kSize;
+    }
+    buf_ = part.data.get();
+    cap_ = part.capacity;
+  }
 
   GuardedWriter& text(std::string_view s) {
-    if (s.size() > kSize - used_) {
-      flush();
-      if (s.size() > kSize) {
+    if (s.size() > cap_ - used_) {
+      if (!part_ && s.size() > kSize) {
+        flush();
         writeOut(s.data(), s.size());
         return *this;
       }
+      makeRoom(s.size());
     }
-    std::memcpy(buf_.get() + used_, s.data(), s.size());
+    std::memcpy(buf_ + used_, s.data(), s.size());
     used_ += s.size();
     return *this;
   }
@@ -112,54 +136,64 @@ class GuardedWriter {
   }
   GuardedWriter& tab() { return ch('\t'); }
   GuardedWriter& number(std::uint32_t v) {
-    if (kSize - used_ < 16) flush();
-    used_ = static_cast<std::size_t>(put(buf_.get() + used_, v) - buf_.get());
+    used_ = static_cast<std::size_t>(put(room(16), v) - buf_);
     return *this;
   }
-  // Two digits at a time: most numbers of a report are small line numbers and counts.
-  static char* put(char* q, std::uint32_t v) {
-    std::size_t n = 1;
-    for (std::uint32_t rest = v; rest >= 10; rest /= 10) ++n;
-    char* end = q + n;
-    q = end;
-    while (v >= 100) {
-      q -= 2;
-      q[0] = kDigitPairs[2 * (v % 100)];
-      q[1] = kDigitPairs[2 * (v % 100) + 1];
-      v /= 100;
+  // Most numbers of a report are line numbers and counts of at most 10000: those take a
+  // branch or two and whole digit pairs.
+  [[gnu::always_inline]] static char* put(char* q, std::uint32_t v) {
+    if (v < 100) {
+      if (v < 10) {
+        *q = static_cast<char>('0' + v);
+        return q + 1;
+      }
+      std::memcpy(q, kDigitPairs + 2 * v, 2);
+      return q + 2;
     }
-    if (v < 10) {
-      q[-1] = static_cast<char>('0' + v);
-    } else {
-      q[-2] = kDigitPairs[2 * v];
-      q[-1] = kDigitPairs[2 * v + 1];
+    if (v < 10000) {
+      if (v < 1000) {
+        *q = static_cast<char>('0' + v / 100);
+        std::memcpy(q + 1, kDigitPairs + 2 * (v % 100), 2);
+        return q + 3;
+      }
+      std::memcpy(q, kDigitPairs + 2 * (v / 100), 2);
+      std::memcpy(q + 2, kDigitPairs + 2 * (v % 100), 2);
+      return q + 4;
     }
-    return end;
+    return std::to_chars(q, q + 10, v).ptr;
   }
   // The lines of blocks and source lines, most of a report, are written straight into the
-  // buffer: room() gives space for a line of at most n bytes, took() ends it at `end`.
+  // buffer: room() gives space for a line of at most n bytes, lineSpace() the free space up
+  // (at least kSlack bytes), took() ends what was written at `end`.
   char* room(std::size_t n) {
-    if (kSize - used_ < n) flush();
-    return buf_.get() + used_;
+    if (cap_ - used_ < n) makeRoom(n);
+    return buf_ + used_;
+  }
+  struct Space {
+    char* begin;
+    const char* end;
+  };
+  Space lineSpace() {
+    if (cap_ - used_ < kSlack) makeRoom(kSlack);
+    return Space{buf_ + used_, buf_ + cap_};
   }
   void took(char* end) {
-    used_ = static_cast<std::size_t>(end - buf_.get());
-    if (used_ >= kFlushAt) flush();
+    used_ = static_cast<std::size_t>(end - buf_);
+    if (cap_ - used_ < kSlack) makeRoom(kSlack);
   }
   // Ends a line; the buffer goes out once it is nearly full.
   void endLine() {
     ch('\n');
-    if (used_ >= kFlushAt) flush();
-  }
-
-  void flush() {
-    writeOut(buf_.get(), used_);
-    used_ = 0;
+    if (cap_ - used_ < kSlack) makeRoom(kSlack);
   }
 
   ErrorCode finish() {
+    if (part_) {
+      part_->size = used_;
+      return allOK;
+    }
     flush();
-    if (!failed_ && stream_ && std::fflush(stream_) != 0) fail();
+    if (!failed_ && std::fflush(stream_) != 0) fail();
     if (!failed_) return allOK;
     if (savedErrno_ == EPIPE) {
       clearPendingSystemError();
@@ -172,19 +206,33 @@ class GuardedWriter {
 
  private:
   static constexpr std::size_t kSize = 1 << 17;
-  static constexpr std::size_t kFlushAt = kSize - 4096;
+  static constexpr std::size_t kSlack = 4096;
 
   GuardedWriter& ch(char c) {
-    if (used_ == kSize) flush();
+    if (used_ == cap_) makeRoom(1);
     buf_[used_++] = c;
     return *this;
   }
-  void writeOut(const char* data, std::size_t n) {
-    if (failed_ || n == 0) return;
-    if (memory_) {
-      memory_->append(data, n);
+  void flush() {
+    writeOut(buf_, used_);
+    used_ = 0;
+  }
+  // Room for n more bytes: the stream's buffer is written out, a part grows.
+  void makeRoom(std::size_t n) {
+    if (!part_) {
+      flush();
       return;
     }
+    const std::size_t wanted = std::max(2 * cap_, used_ + n + kSlack);
+    std::unique_ptr<char[]> bigger(new char[wanted]);
+    std::memcpy(bigger.get(), buf_, used_);
+    part_->data = std::move(bigger);
+    part_->capacity = wanted;
+    buf_ = part_->data.get();
+    cap_ = wanted;
+  }
+  void writeOut(const char* data, std::size_t n) {
+    if (failed_ || n == 0) return;
     if (std::fwrite(data, 1, n, stream_) != n) fail();
   }
   void fail() {
@@ -194,8 +242,10 @@ class GuardedWriter {
   }
 
   FILE* stream_;
-  std::string* memory_ = nullptr;
-  std::unique_ptr<char[]> buf_;
+  TextPart* part_ = nullptr;
+  std::unique_ptr<char[]> own_;
+  char* buf_ = nullptr;
+  std::size_t cap_ = 0;
   std::size_t used_ = 0;
   bool failed_ = false;
   int savedErrno_ = 0;
@@ -225,47 +275,90 @@ void writeHeader(GuardedWriter& w, std::time_t when) {
   w.text(hashes).endLine();
 }
 
-void writeFunction(GuardedWriter& w, const SumFile& file, const LineStates& states,
-                   const SumFunc& fn) {
+// A file's lines for the report: packed words where the file has them, else its line states.
+struct ReportLines {
+  const std::vector<std::uint32_t>& packed;
+  const LineStates* states;  // when packed is empty
+};
+
+// The records of blocks and lines are most of a report. They are written through a local
+// cursor (no stores through the writer in between) with room for one record checked once.
+[[gnu::always_inline]] inline char* putBlockRecord(char* q, std::uint32_t line, std::uint32_t hits) {
+  std::memcpy(q, "bl\t", 3);
+  q = GuardedWriter::put(q + 3, line);
+  *q++ = '\t';
+  q = GuardedWriter::put(q, saturate(hits));
+  *q++ = '\n';
+  return q;
+}
+
+// Dead code under adjustments has no record: q comes back as it was.
+[[gnu::always_inline]] inline char* putLineRecord(char* q, std::uint32_t line, std::uint32_t flags, std::uint16_t count) {
+  const bool adjusted = (flags & adjAnyMask) != 0;
+  if (adjusted && lineUnusedDead(flags, count)) return q;
+  std::memcpy(q, "li\t", 3);
+  q = GuardedWriter::put(q + 3, line);
+  *q++ = '\t';
+  if (count != 0 || !adjusted) {
+    q = GuardedWriter::put(q, saturate(count));
+  } else {
+    const char* t = exportCountText(true, flags, count);
+    const std::size_t n = std::strlen(t);  // "0", "TEST" or "INSP"
+    std::memcpy(q, t, n);
+    q += n;
+  }
+  *q++ = '\n';
+  return q;
+}
+
+void writeFunction(GuardedWriter& w, const SumFile& file, const ReportLines& lines, const SumFunc& fn) {
   w.lit("fu\t").name(fn.name).tab().number(fn.counts.unusedBlocks).tab().number(fn.counts.blocks);
   w.tab().number(fn.counts.adjUnusedLines).tab().number(fn.counts.adjLines);
   w.tab().number(saturate(fn.calls));
   w.endLine();
+  GuardedWriter::Space room = w.lineSpace();
+  char* q = room.begin;
+  const char* end = room.end;
+  auto ensure = [&w, &q, &end] {
+    if (end - q >= kMaxRecordLine) return;
+    w.took(q);
+    const GuardedWriter::Space more = w.lineSpace();
+    q = more.begin;
+    end = more.end;
+  };
   const ObjRecord* rec = file.record;
-  if (rec) {
-    std::size_t last = std::min<std::size_t>(fn.lastMapIndex, rec->map.size() - 1);
-    for (std::size_t i = fn.firstMapIndex; !rec->map.empty() && i <= last; ++i) {
-      if (mapTag(rec->map[i]) != TagBlock) continue;
-      std::uint32_t hits = i < rec->counts.size() ? rec->counts[i] : 0;
-      char* q = w.room(32);
-      std::memcpy(q, "bl\t", 3);
-      q = GuardedWriter::put(q + 3, mapValue(rec->map[i]));
-      *q++ = '\t';
-      q = GuardedWriter::put(q, saturate(hits));
-      *q++ = '\n';
-      w.took(q);
+  if (rec && !rec->map.empty()) {
+    const std::uint32_t* map = rec->map.data();
+    const std::uint16_t* counts = rec->counts.data();
+    const std::size_t countsSize = rec->counts.size();
+    const std::size_t last = std::min<std::size_t>(fn.lastMapIndex, rec->map.size() - 1);
+    for (std::size_t i = fn.firstMapIndex; i <= last; ++i) {
+      if (mapTag(map[i]) != TagBlock) continue;
+      ensure();
+      q = putBlockRecord(q, mapValue(map[i]), i < countsSize ? counts[i] : 0);
     }
   }
-  if (fn.firstLine != 0) {
-    std::uint32_t last = std::min<std::uint32_t>(fn.lastLine, std::uint32_t(states.size()));
-    states.forEachCodeLine(fn.firstLine, last, [&](std::uint32_t l, const LineState& s) {
-      if ((s.flags & adjAnyMask) && lineUnusedDead(s.flags, s.count)) return;
-      char* q = w.room(48);
-      std::memcpy(q, "li\t", 3);
-      q = GuardedWriter::put(q + 3, l);
-      *q++ = '\t';
-      if (s.count != 0) {
-        q = GuardedWriter::put(q, saturate(s.count));
-      } else {
-        const char* t = exportCountText(true, s.flags, s.count);
-        const std::size_t n = std::strlen(t);  // "0", "DEAD", "TEST" or "INSP"
-        std::memcpy(q, t, n);
-        q += n;
-      }
-      *q++ = '\n';
-      w.took(q);
+  if (fn.firstLine != 0 && lines.states) {
+    const std::uint32_t last = std::min<std::uint32_t>(fn.lastLine, lines.states->size());
+    lines.states->forEachCodeLine(fn.firstLine, last, [&](std::uint32_t l, const LineState& s) {
+      ensure();
+      q = putLineRecord(q, l, s.flags, s.count);
     });
+  } else if (fn.firstLine != 0 && !lines.packed.empty()) {
+    const std::uint32_t lineCount = static_cast<std::uint32_t>(lines.packed.size() - 1);
+    const std::uint32_t last = std::min(fn.lastLine, lineCount);
+    // As with line states, a first line past the file's last one (only a damaged map has
+    // such a function) starts at the last one.
+    const std::uint32_t first = std::min(fn.firstLine, lineCount);
+    const std::uint32_t* packed = lines.packed.data();
+    for (std::uint32_t l = first; l <= last; ++l) {
+      const std::uint32_t word = packed[l];
+      if (!(word & (LineHasCode << 16))) continue;
+      ensure();
+      q = putLineRecord(q, l, word >> 16, static_cast<std::uint16_t>(word));
+    }
   }
+  w.took(q);
   w.lit("efu\t").name(fn.name).endLine();
 }
 
@@ -291,8 +384,9 @@ void writeFile(GuardedWriter& w, const SumFile& f, LazyLineStates& lineStates) {
   w.tab().number(fc.adjUnusedLines).tab().number(fc.adjLines).tab().number(f.unusedFuncs);
   w.tab().number(f.funcs).tab().number(saturate(f.sessions));
   w.endLine();
-  const LineStates& states = lineStates.of(f);
-  for (const SumFunc* fn : f.funcOrder) writeFunction(w, f, states, *fn);
+  const std::vector<std::uint32_t>& packed = lineStates.packed(f);
+  const ReportLines lines{packed, packed.empty() ? &lineStates.of(f) : nullptr};
+  for (const SumFunc* fn : f.funcOrder) writeFunction(w, f, lines, *fn);
   w.lit("efi\t").name(f.name).endLine();
 }
 
@@ -326,7 +420,7 @@ constexpr std::size_t kEntriesPerStretch = std::size_t(1) << 20;
 ErrorCode writeStepsInParallel(GuardedWriter& w, const std::vector<ReportStep>& steps, const SumRoot& root,
                                MessageSink& messages) {
   const unsigned threads = std::max(1u, std::min(4u, std::thread::hardware_concurrency()));
-  std::vector<std::string> parts(threads);
+  std::vector<TextPart> parts(threads);
   std::vector<MessageList> notices(threads);
   std::vector<std::unique_ptr<LazyLineStates>> lineStates;
   for (unsigned t = 0; t < threads; ++t)
@@ -347,8 +441,7 @@ ErrorCode writeStepsInParallel(GuardedWriter& w, const std::vector<ReportStep>& 
     cuts.back() = to;
     auto format = [&](unsigned t) {
       try {
-        parts[t].clear();
-        GuardedWriter part(&parts[t]);
+        GuardedWriter part(parts[t]);
         for (std::size_t k = cuts[t]; k < cuts[t + 1]; ++k) writeStep(part, steps[k], *lineStates[t]);
         part.finish();
       } catch (...) {
@@ -375,7 +468,7 @@ ErrorCode writeStepsInParallel(GuardedWriter& w, const std::vector<ReportStep>& 
         }
       }
       notices[t].messages.clear();
-      w.text(parts[t]);
+      w.text(parts[t].view());
     }
     from = to;
   }

@@ -126,9 +126,7 @@ const LineState& LineStates::at(std::size_t index) const {
   return (*this)[index];
 }
 
-LineState* LineStates::single(std::uint32_t line) {
-  if (line == 0 || line > lineCount_) return nullptr;
-  if (segs_.size() == lineCount_) return &segs_[line - 1].state;  // a segment per line
+LineState* LineStates::singleInSegments(std::uint32_t line) {
   const std::size_t k = indexOf(line);
   return segs_[k].first == line && lastOf(k) == line ? &segs_[k].state : nullptr;
 }

@@ -36,7 +36,11 @@ class LineStates {
   // As operator[], checking the index (std::out_of_range).
   const LineState& at(std::size_t index) const;
   // The state of a line that is a segment of its own; null for any other line.
-  LineState* single(std::uint32_t line);
+  LineState* single(std::uint32_t line) {
+    if (line == 0 || line > lineCount_) return nullptr;
+    if (segs_.size() == lineCount_) return &segs_[line - 1].state;  // a segment per line
+    return singleInSegments(line);
+  }
   std::size_t segments() const { return segs_.size(); }
 
   // Calls fn(first, last, state) for every segment in order (mutable, for building).
@@ -64,6 +68,7 @@ class LineStates {
     LineState state;
   };
   std::size_t indexOf(std::uint32_t line) const;  // the segment holding the line
+  LineState* singleInSegments(std::uint32_t line);
   std::uint32_t lastOf(std::size_t k) const {
     return k + 1 < segs_.size() ? segs_[k + 1].first - 1 : lineCount_;
   }

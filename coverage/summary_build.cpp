@@ -160,45 +160,7 @@ void FileCounter::accountLines(SumFunc& fn, std::size_t s, std::size_t end) {
   fn.lastLine = l;
 }
 
-// scanBlocks and accountLines at once, for blocks in line order (inOrder false: the counts
-// are to be thrown away).
-ErrorCode FileCounter::countInOnePass(SumFunc& fn, std::size_t s, std::size_t& end, bool& inOrder) {
-  if (mapTag(map_[s]) != TagBlock) return corruptKgvFile;
-  const std::uint32_t* map = map_.data();
-  const bool allCounts = counts_.size() >= end;
-  std::uint32_t l = line(s);
-  std::uint16_t c = count(s);
-  std::uint16_t b = c;
-  fn.firstLine = l;
-  ++fn.counts.blocks;
-  if (c == 0) ++fn.counts.unusedBlocks;
-  for (std::size_t k = s + 1; k < end; ++k) {
-    const std::uint32_t e = map[k];
-    const std::uint32_t tag = mapTag(e);
-    if (tag == TagEmpty) continue;
-    const std::uint32_t at = mapValue(e);
-    if (tag == TagBlock) {
-      b = allCounts ? counts_[k] : count(k);
-      ++fn.counts.blocks;
-      if (b == 0) ++fn.counts.unusedBlocks;
-    } else if (tag != TagBlockLine) {
-      return corruptKgvFile;
-    }
-    if (at < l) inOrder = false;
-    if (at != l) {
-      account(fn.counts, l, c);
-      c = b;
-      l = at;
-    } else {
-      c = combineHits(policy_, c, b);
-    }
-  }
-  account(fn.counts, l, c);
-  fn.lastLine = l;
-  return allOK;
-}
-
-void FileCounter::account(SumCounts& c, std::uint32_t lineNo, std::uint16_t hits) const {
+inline void FileCounter::account(SumCounts& c, std::uint32_t lineNo, std::uint16_t hits) const {
   ++c.lines;
   if (hits != 0) {
     ++c.adjLines;
@@ -215,6 +177,50 @@ void FileCounter::account(SumCounts& c, std::uint32_t lineNo, std::uint16_t hits
     return;
   }
   countUnusedLine(c, dominantAdjust(adjustBits(set_, lineNo)));
+}
+
+// scanBlocks and accountLines at once, for blocks in line order (inOrder false: the counts
+// are to be thrown away).
+ErrorCode FileCounter::countInOnePass(SumFunc& fn, std::size_t s, std::size_t& end, bool& inOrder) {
+  if (mapTag(map_[s]) != TagBlock) return corruptKgvFile;
+  // Everything the loop touches is local, so that it stays in registers.
+  const std::uint32_t* map = map_.data();
+  const std::uint16_t* counts = counts_.data();
+  const std::size_t stop = end, countsSize = counts_.size();
+  SumCounts sum = fn.counts;
+  bool ordered = true;
+  std::uint32_t l = line(s);
+  std::uint16_t c = count(s);
+  std::uint16_t b = c;
+  fn.firstLine = l;
+  ++sum.blocks;
+  if (c == 0) ++sum.unusedBlocks;
+  for (std::size_t k = s + 1; k < stop; ++k) {
+    const std::uint32_t e = map[k];
+    const std::uint32_t tag = mapTag(e);
+    if (tag == TagEmpty) continue;
+    const std::uint32_t at = mapValue(e);
+    if (tag == TagBlock) {
+      b = k < countsSize ? counts[k] : 0;
+      ++sum.blocks;
+      sum.unusedBlocks += b == 0;
+    } else if (tag != TagBlockLine) {
+      return corruptKgvFile;
+    }
+    if (at < l) ordered = false;
+    if (at != l) {
+      account(sum, l, c);
+      c = b;
+      l = at;
+    } else {
+      c = combineHits(policy_, c, b);
+    }
+  }
+  account(sum, l, c);
+  fn.counts = sum;
+  fn.lastLine = l;
+  if (!ordered) inOrder = false;
+  return allOK;
 }
 
 ErrorCode FileCounter::run() {
@@ -277,6 +283,14 @@ ErrorCode FileCounter::run() {
   return allOK;
 }
 
+// Lines past the end of the file's lines are never stored; when asked for, the first one of
+// a file is reported.
+void noticeDamagedLines(MessageSink& messages, const ObjRecord& record) {
+  messages.notice(stringPrintf("The line number information of file %s is corrupted.\n"
+                               "Kestrel will not process this information\n",
+                               record.fileName()));
+}
+
 void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
                      MessageSink& messages, LineStates& states, bool withClasses = true) {
   if (f.lineCount == 0 || !f.record) {
@@ -319,13 +333,9 @@ void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet*
     } else if (tag == TagBlock || tag == TagBlockLine) {
       if (tag == TagBlock) blockCount = i < counts.size() ? counts[i] : 0;
       if (v > f.lineCount) {
-        // Lines past the end of the file's lines are never stored; when asked for, the first
-        // one of the file is reported.
         if (!reported && corruptedLinesReported()) {
           reported = true;
-          messages.notice(stringPrintf("The line number information of file %s is corrupted.\n"
-                                       "Kestrel will not process this information\n",
-                                       f.record->fileName()));
+          noticeDamagedLines(messages, *f.record);
         }
         continue;
       }
@@ -353,17 +363,29 @@ void addTimes(std::uint32_t& first, std::uint32_t& last, std::uint32_t f, std::u
 
 std::size_t gEntriesForThreads = std::size_t(4) << 20;
 
+void listFunctions(SumFile& f);
+
+// What a first build does for a file besides counting it.
+struct FirstBuild {
+  std::uint32_t sortOrder;  // the file's functions are sorted by it once counted
+};
+
 // Counts every file; files are independent of each other, so large data are counted on
-// several threads. Each file's code is kept for the caller to take in order.
-std::vector<ErrorCode> countFiles(SumRoot& root, std::uint32_t policy, const AdjustIndex& index) {
+// several threads. Each file's code is kept for the caller to take in order. On a first
+// build each file's functions are listed before and sorted after, while its data are at hand.
+std::vector<ErrorCode> countFiles(SumRoot& root, std::uint32_t policy, const AdjustIndex& index,
+                                  const FirstBuild* first) {
   std::vector<std::pair<SumDir*, SumFile*>> files;
   for (SumDir& d : root.dirRecords)
     for (SumFile& f : d.fileRecords) files.emplace_back(&d, &f);
   std::vector<ErrorCode> codes(files.size(), allOK);
   auto count = [&](std::size_t from, std::size_t to) {
     for (std::size_t k = from; k < to; ++k) {
+      SumFile& f = *files[k].second;
       try {
-        codes[k] = FileCounter(*files[k].second, policy, index.find(*files[k].first, *files[k].second)).run();
+        if (first) listFunctions(f);
+        codes[k] = FileCounter(f, policy, index.find(*files[k].first, f)).run();
+        if (first && codes[k] == allOK) sortFunctions(f, first->sortOrder);
       } catch (const std::bad_alloc&) {
         codes[k] = outOfMemory;
       }
@@ -376,8 +398,8 @@ std::vector<ErrorCode> countFiles(SumRoot& root, std::uint32_t policy, const Adj
 }
 
 ErrorCode computeStatistics(SumRoot& root, std::uint32_t policy, const AdjustIndex& index,
-                            MessageSink& messages, bool withLineStates) {
-  const std::vector<ErrorCode> codes = countFiles(root, policy, index);
+                            MessageSink& messages, bool withLineStates, const FirstBuild* first = nullptr) {
+  const std::vector<ErrorCode> codes = countFiles(root, policy, index, first);
   std::size_t fileNo = 0;
   root.counts = SumCounts{};
   root.funcs = root.unusedFuncs = root.deadFuncs = root.files = 0;
@@ -552,27 +574,12 @@ ErrorCode buildTree(KgvData& data, std::uint32_t sortOrder, std::uint32_t hitsPo
     f.record = &rec;
   }
 
-  // Functions: one per TagFunction entry, in map order; files apart, so on a few threads
-  // for large data.
-  std::vector<SumFile*> files;
-  for (SumDir& d : root->dirRecords)
-    for (SumFile& f : d.fileRecords) files.push_back(&f);
-  std::atomic<bool> noRoom{false};
-  runInParallel(
-      files.size(), [&](std::size_t k) { return files[k]->record->map.size(); }, gEntriesForThreads,
-      [&](std::size_t from, std::size_t to) {
-        try {
-          for (std::size_t r = from; r < to; ++r) listFunctions(*files[r]);
-        } catch (const std::bad_alloc&) {
-          noRoom = true;
-        }
-      });
-  if (noRoom) return outOfMemory;
-
+  // Functions: one per TagFunction entry, in map order, listed, counted and sorted file by file.
   root->lineStatesKept = withLineStates;
-  rc = computeStatistics(*root, hitsPolicy, AdjustIndex(adjustments), messages, withLineStates);
+  const FirstBuild first{sortOrder};
+  rc = computeStatistics(*root, hitsPolicy, AdjustIndex(adjustments), messages, withLineStates, &first);
   if (rc != allOK) return rc;
-  sortSummary(*root, sortOrder);
+  sortSummary(*root, sortOrder, false);
   out = std::move(root);
   return allOK;
 }
@@ -693,4 +700,40 @@ const LineStates& LazyLineStates::of(const SumFile& file) {
     return file.lineStates;
   buildLineStates(file, policy_, index_->sets.find(*file.dir, file), messages_, scratch_, withClasses_);
   return scratch_;
+}
+
+const std::vector<std::uint32_t>& LazyLineStates::packed(const SumFile& file) {
+  packed_.clear();
+  if (file.lineCount == 0 || !file.lineStates.empty() || !file.dir || !file.record) return packed_;
+  const std::vector<std::uint32_t>& map = file.record->map;
+  const std::vector<std::uint16_t>& counts = file.record->counts;
+  // Far-apart line numbers would make the array mostly empty: segments serve those.
+  if (file.lineCount > 8 * map.size() + 1024) return packed_;
+  const CvgAdjustSet* set = index_->sets.find(*file.dir, file);
+  packed_.assign(std::size_t(file.lineCount) + 1, 0);
+  std::uint32_t* lines = packed_.data();
+  std::uint16_t blockCount = 0;
+  bool reported = false;
+  // As buildLineStates does for the lines with code.
+  for (std::size_t i = 0; i < map.size(); ++i) {
+    const std::uint32_t tag = mapTag(map[i]);
+    if (tag != TagBlock && tag != TagBlockLine) continue;
+    const std::uint32_t v = mapValue(map[i]);
+    if (tag == TagBlock) blockCount = i < counts.size() ? counts[i] : 0;
+    if (v > file.lineCount) {
+      if (!reported && corruptedLinesReported()) {
+        reported = true;
+        noticeDamagedLines(messages_, *file.record);
+      }
+      continue;
+    }
+    if (v == 0) continue;
+    std::uint32_t& w = lines[v];
+    if (w & (LineHasCode << 16)) {
+      w = (w & 0xFFFF0000u) | combineHits(policy_, static_cast<std::uint16_t>(w), blockCount);
+    } else {
+      w = (LineHasCode | adjustBits(set, v)) << 16 | blockCount;
+    }
+  }
+  return packed_;
 }

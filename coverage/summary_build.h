@@ -73,6 +73,11 @@ class LazyLineStates {
   LazyLineStates& operator=(const LazyLineStates&) = delete;
   // Valid until the next call.
   const LineStates& of(const SumFile& file);
+  // For a report, which needs no classes: the flags and hits of lines 0..lineCount packed
+  // one word per line (flags << 16 | hits), made in one pass over the map where the file's
+  // line numbers lie close together. Empty where they do not, or where the tree keeps the
+  // file's line states: of() serves those. Valid until the next call.
+  const std::vector<std::uint32_t>& packed(const SumFile& file);
 
  private:
   struct Index;
@@ -81,4 +86,5 @@ class LazyLineStates {
   MessageSink& messages_;
   bool withClasses_;
   LineStates scratch_;
+  std::vector<std::uint32_t> packed_;
 };

@@ -100,50 +100,21 @@ SortKey keyOf(const Record* r) {
   return SortKey{r->name, r->nativeIndex, &r->counts, r};
 }
 
-template <typename Record>
-void sortLevel(std::vector<Record*>& order, SortComparison cmp) {
+// The comparison is a template argument, so it is inlined into the sort: a large summary
+// sorts millions of functions.
+template <SortComparison Cmp, typename Record>
+void sortLevel(std::vector<Record*>& order) {
   if (order.size() < 2) return;
-  std::sort(order.begin(), order.end(), [cmp](const Record* a, const Record* b) {
-    return cmp(keyOf(a), keyOf(b)) < 0;
-  });
+  std::sort(order.begin(), order.end(), [](const Record* a, const Record* b) { return Cmp(keyOf(a), keyOf(b)) < 0; });
 }
 
-}  // namespace
-
-SortComparison sortComparator(std::uint32_t id) {
-  switch (id) {
-    case 1: return withTieBreak<byNothing>;
-    case 2: return byNative;
-    case 3: return withTieBreak<byLines>;
-    case 4: return withTieBreak<byLUsed>;
-    case 5: return withTieBreak<byLUsedPct>;
-    case 6: return withTieBreak<byLUnused>;
-    case 7: return withTieBreak<byLUnusedPct>;
-    case 8: return withTieBreak<byAdjLines>;
-    case 9: return withTieBreak<byAlUsed>;
-    case 10: return withTieBreak<byAlUsedPct>;
-    case 11: return withTieBreak<byAlUnused>;
-    case 12: return withTieBreak<byAlUnusedPct>;
-    case 13: return withTieBreak<byBlocks>;
-    case 14: return withTieBreak<byBUsed>;
-    case 15: return withTieBreak<byBUsedPct>;
-    case 16: return withTieBreak<byBUnused>;
-    case 17: return withTieBreak<byBUnusedPct>;
-    default: return nullptr;
-  }
-}
-
-namespace {
 std::size_t gFunctionsForThreads = std::size_t(256) << 10;
-}  // namespace
 
-void setSortThreadThreshold(std::size_t functions) { gFunctionsForThreads = functions; }
-
-ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder) {
-  SortComparison cmp = sortComparator(sortOrder);
-  if (!cmp) return allOK;
-  sortLevel(root.dirOrder, cmp);
-  for (SumDir* d : root.dirOrder) sortLevel(d->fileOrder, cmp);
+template <SortComparison Cmp>
+void sortTree(SumRoot& root, bool functionsToo) {
+  sortLevel<Cmp>(root.dirOrder);
+  for (SumDir* d : root.dirOrder) sortLevel<Cmp>(d->fileOrder);
+  if (!functionsToo) return;
   // Each file's functions are sorted apart from the others': many files, on a few threads.
   try {
     std::vector<SumFile*> files;
@@ -151,13 +122,53 @@ ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder) {
     runInParallel(
         files.size(), [&](std::size_t k) { return files[k]->funcOrder.size(); }, gFunctionsForThreads,
         [&](std::size_t from, std::size_t to) {
-          for (std::size_t k = from; k < to; ++k) sortLevel(files[k]->funcOrder, cmp);
+          for (std::size_t k = from; k < to; ++k) sortLevel<Cmp>(files[k]->funcOrder);
         });
   } catch (const std::bad_alloc&) {
     // No room for the list of files: one file after the other.
     for (SumDir* d : root.dirOrder)
-      for (SumFile* f : d->fileOrder) sortLevel(f->funcOrder, cmp);
+      for (SumFile* f : d->fileOrder) sortLevel<Cmp>(f->funcOrder);
   }
-  root.sortOrder = sortOrder;
+}
+
+// Calls fn.template operator()<Cmp>() with the comparison of the order; false for an id
+// outside 1..17.
+template <typename Fn>
+bool withComparison(std::uint32_t sortOrder, Fn fn) {
+  switch (sortOrder) {
+    case 1: fn.template operator()<withTieBreak<byNothing>>(); break;
+    case 2: fn.template operator()<byNative>(); break;
+    case 3: fn.template operator()<withTieBreak<byLines>>(); break;
+    case 4: fn.template operator()<withTieBreak<byLUsed>>(); break;
+    case 5: fn.template operator()<withTieBreak<byLUsedPct>>(); break;
+    case 6: fn.template operator()<withTieBreak<byLUnused>>(); break;
+    case 7: fn.template operator()<withTieBreak<byLUnusedPct>>(); break;
+    case 8: fn.template operator()<withTieBreak<byAdjLines>>(); break;
+    case 9: fn.template operator()<withTieBreak<byAlUsed>>(); break;
+    case 10: fn.template operator()<withTieBreak<byAlUsedPct>>(); break;
+    case 11: fn.template operator()<withTieBreak<byAlUnused>>(); break;
+    case 12: fn.template operator()<withTieBreak<byAlUnusedPct>>(); break;
+    case 13: fn.template operator()<withTieBreak<byBlocks>>(); break;
+    case 14: fn.template operator()<withTieBreak<byBUsed>>(); break;
+    case 15: fn.template operator()<withTieBreak<byBUsedPct>>(); break;
+    case 16: fn.template operator()<withTieBreak<byBUnused>>(); break;
+    case 17: fn.template operator()<withTieBreak<byBUnusedPct>>(); break;
+    default: return false;
+  }
+  return true;
+}
+
+}  // namespace
+
+void setSortThreadThreshold(std::size_t functions) { gFunctionsForThreads = functions; }
+
+ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder, bool functionsToo) {
+  // Any other id leaves the tree as it is.
+  if (withComparison(sortOrder, [&]<SortComparison Cmp>() { sortTree<Cmp>(root, functionsToo); }))
+    root.sortOrder = sortOrder;
   return allOK;
+}
+
+void sortFunctions(SumFile& file, std::uint32_t sortOrder) {
+  withComparison(sortOrder, [&]<SortComparison Cmp>() { sortLevel<Cmp>(file.funcOrder); });
 }

@@ -18,12 +18,12 @@ struct SortKey {
 // Negative when a comes first, positive when b does, 0 for the same record.
 using SortComparison = int (*)(const SortKey& a, const SortKey& b);
 
-// The comparison of an order (1..17); nullptr for 18 or any id outside the table.
-SortComparison sortComparator(std::uint32_t id);
-
-// Sorts dirOrder, every fileOrder and every funcOrder by the order and stores it in the
-// root. Ids outside 1..17 leave the tree as it is.
-ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder);
+// Sorts dirOrder, every fileOrder and (unless functionsToo is false: they were sorted file by
+// file) every funcOrder by the order and stores it in the root. Ids outside 1..17 leave the
+// tree as it is.
+ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder, bool functionsToo = true);
+// Sorts one file's funcOrder by the order, as sortSummary does.
+void sortFunctions(SumFile& file, std::uint32_t sortOrder);
 // Summaries with at least this many functions have them sorted on several threads (tests
 // set 0).
 void setSortThreadThreshold(std::size_t functions);
