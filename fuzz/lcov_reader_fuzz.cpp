@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <fstream>
 #include <string>
+#include <string_view>
 
 #include "fuzz/import_checks.h"
 #include "tools/import/coverage_import.h"
@@ -26,11 +27,36 @@ extern "C" int LLVMFuzzerInitialize(int*, char***) {
   return 0;
 }
 
+// Plain tracefiles are read in pieces that end at lines' ends: fed line by line, the
+// reader accepts or refuses alike, with the same message, and keeps as many files.
+void checkReadInPieces(const std::string& text, bool wholeOk, const ImportError& wholeError,
+                       const ImportedData& whole) {
+  ImportedData pieces;
+  ImportError error;
+  bool ok = true;
+  {
+    LcovTracefileReader reader("fuzz.info", pieces, error, text.size());
+    std::size_t from = 0;
+    while (ok && from < text.size()) {
+      std::size_t nl = text.find('\n', from);
+      std::size_t to = nl == std::string::npos ? text.size() : nl + 1;
+      ok = reader.feed(std::string_view(text).substr(from, to - from));
+      from = to;
+    }
+    ok = reader.finish() && ok;
+  }
+  if (ok != wholeOk) kgfuzz::fail("read in pieces, the tracefile is taken or refused otherwise");
+  if (!ok && error.text() != wholeError.text()) kgfuzz::fail("read in pieces, the tracefile is refused for another reason");
+  if (pieces.files.size() != whole.files.size()) kgfuzz::fail("read in pieces, the tracefile has other files");
+}
+
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   std::string text(reinterpret_cast<const char*>(data), size);
   ImportedData imported;
   ImportError error;
-  if (!readLcovTracefile("fuzz.info", text, imported, error)) {
+  const bool ok = readLcovTracefile("fuzz.info", text, imported, error);
+  checkReadInPieces(text, ok, error, imported);
+  if (!ok) {
     if (error.message.empty()) kgfuzz::fail("refused without a message");
     return 0;
   }

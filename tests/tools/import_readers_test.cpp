@@ -366,6 +366,99 @@ TEST(Inputs, ImportsAddedTogetherEqualOneImportOfAllInputs) {
   EXPECT_EQ(k1->records[0]->strings, k2->records[0]->strings);
 }
 
+namespace {
+
+// The records an import makes, with the same import time: equal when the data are.
+std::unique_ptr<KgvData> recordsOf(const ImportedData& d) { return makeImportedData(d, 1); }
+
+void expectSameRecords(const KgvData& a, const KgvData& b) {
+  ASSERT_EQ(a.records.size(), b.records.size());
+  for (std::size_t k = 0; k < a.records.size(); ++k) {
+    EXPECT_EQ(a.records[k]->map, b.records[k]->map) << k;
+    EXPECT_EQ(a.records[k]->counts, b.records[k]->counts) << k;
+    EXPECT_EQ(a.records[k]->strings, b.records[k]->strings) << k;
+  }
+}
+
+}  // namespace
+
+TEST(Inputs, APlainTracefileReadInPiecesReadsAsTheWholeText) {
+  // Larger than a piece, so that records, lines and a very long line cross the pieces'
+  // ends; the last line has no newline.
+  std::string text;
+  for (int f = 0; text.size() < (std::size_t(9) << 20); ++f) {
+    text += "TN:t\nSF:/src/d" + std::to_string(f % 7) + "/f" + std::to_string(f) + ".c\n";
+    text += "FN:1,fn" + std::to_string(f) + "\nFNDA:" + std::to_string(f % 3) + ",fn" + std::to_string(f) + "\n";
+    for (int l = 1; l < 90; l += 2) {
+      text += "DA:" + std::to_string(l) + "," + std::to_string((l * f) % 5) + "\n";
+      if (l % 10 == 1) text += "BRDA:" + std::to_string(l) + ",0,1," + std::to_string(f % 4) + "\n";
+    }
+    if (f == 3000) text += "TN:" + std::string(std::size_t(5) << 20, 'x') + "\n";  // longer than a piece
+    text += "end_of_record\n";
+  }
+  text.pop_back();
+  kgtest::TempDir dir;
+  kgtest::writeFile(dir.file("big.info"), text);
+  ImportedData whole, streamed;
+  ImportError e;
+  ASSERT_TRUE(readLcovTracefile("big.info", text, whole, e)) << e.text();
+  bool handled = false;
+  ASSERT_TRUE(readPlainTracefile(dir.file("big.info"), streamed, e, handled)) << e.text();
+  EXPECT_TRUE(handled);
+  expectSameRecords(*recordsOf(whole), *recordsOf(streamed));
+
+  // Fed line by line, the same again.
+  ImportedData byLines;
+  {
+    LcovTracefileReader reader("big.info", byLines, e, text.size());
+    std::size_t from = 0;
+    while (from < text.size()) {
+      std::size_t nl = text.find('\n', from);
+      std::size_t to = nl == std::string::npos ? text.size() : nl + 1;
+      ASSERT_TRUE(reader.feed(std::string_view(text).substr(from, to - from)));
+      from = to;
+    }
+    ASSERT_TRUE(reader.finish());
+  }
+  expectSameRecords(*recordsOf(whole), *recordsOf(byLines));
+
+  // A bad line past the first piece is reported at its line, as in the whole text.
+  std::size_t cut = text.find("DA:", std::size_t(6) << 20);
+  std::string bad = text.substr(0, cut) + "DA:x,1\n" + text.substr(cut);
+  kgtest::writeFile(dir.file("bad.info"), bad);
+  ImportedData d1, d2;
+  ImportError e1, e2;
+  EXPECT_FALSE(readLcovTracefile(dir.file("bad.info"), bad, d1, e1));
+  EXPECT_FALSE(readPlainTracefile(dir.file("bad.info"), d2, e2, handled));
+  EXPECT_TRUE(handled);
+  EXPECT_EQ(e1.text(), e2.text());
+  EXPECT_GT(e2.line, 100000u);
+
+  // A record cut short at the end, and a last line cut short, as the whole text says.
+  for (const std::string& cutShort : {text.substr(0, text.rfind("end_of_record")), text.substr(0, text.size() - 3)}) {
+    kgtest::writeFile(dir.file("cut.info"), cutShort);
+    ImportedData d3, d4;
+    ImportError e3, e4;
+    EXPECT_FALSE(readLcovTracefile(dir.file("cut.info"), cutShort, d3, e3));
+    EXPECT_FALSE(readPlainTracefile(dir.file("cut.info"), d4, e4, handled));
+    EXPECT_EQ(e3.text(), e4.text());
+  }
+
+  // Compressed data, gcov JSON and empty files are read whole instead: nothing is read here.
+  gzFile gz = gzopen(dir.file("big.info.gz").c_str(), "wb");
+  ASSERT_NE(gz, nullptr);
+  gzwrite(gz, text.data(), 4096);
+  gzclose(gz);
+  kgtest::writeFile(dir.file("g.json"), "{\"files\": []}");
+  kgtest::writeFile(dir.file("empty.info"), "");
+  for (const char* name : {"big.info.gz", "g.json", "empty.info", "missing.info"}) {
+    ImportedData none;
+    EXPECT_FALSE(readPlainTracefile(dir.file(name), none, e, handled)) << name;
+    EXPECT_FALSE(handled) << name;
+    EXPECT_TRUE(none.files.empty()) << name;
+  }
+}
+
 TEST(Exclusions, MarkedLinesBranchesAndFunctionsOfGcovDataAreLeftOutAsLcovDoes) {
   kgtest::TempDir dir;
   std::string src = dir.file("x.cc");

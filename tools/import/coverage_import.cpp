@@ -551,6 +551,76 @@ bool readInputText(const std::string& path, std::string& text, ImportError& erro
   return true;
 }
 
+namespace {
+
+// Pieces of a tracefile read at a time; a line longer than this grows the buffer.
+constexpr std::size_t kTracefilePiece = std::size_t(4) << 20;
+
+}  // namespace
+
+bool readPlainTracefile(const std::string& path, ImportedData& data, ImportError& error, bool& handled) {
+  handled = false;
+  int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+  if (fd < 0) return false;
+  struct stat st;
+  if (fstat(fd, &st) != 0 || !S_ISREG(st.st_mode)) {
+    close(fd);
+    return false;
+  }
+  std::string buf(kTracefilePiece, '\0');
+  std::size_t have = 0;  // bytes in buf; the first `have` are not yet fed
+  std::unique_ptr<LcovTracefileReader> reader;
+  int failure = 0;
+  for (;;) {
+    if (have == buf.size()) buf.resize(2 * buf.size());  // a line longer than the buffer
+    ssize_t got = read(fd, buf.data() + have, buf.size() - have);
+    if (got < 0 && errno == EINTR) continue;
+    if (got < 0) failure = errno;
+    if (got <= 0) break;
+    have += static_cast<std::size_t>(got);
+    if (!reader) {
+      // The first piece says what the input is; gzip data and anything not a tracefile go
+      // the way of readInputText, which reads them whole.
+      const bool gzip = have >= 2 && static_cast<unsigned char>(buf[0]) == 0x1f &&
+                        static_cast<unsigned char>(buf[1]) == 0x8b;
+      if (gzip || detectFormat(buf.substr(0, std::min<std::size_t>(have, 4096))) != InputFormat::lcov) {
+        close(fd);
+        return false;
+      }
+      handled = true;
+      error.file = path;
+      error.line = 0;
+      reader = std::make_unique<LcovTracefileReader>(path, data, error, static_cast<std::size_t>(st.st_size));
+    }
+    // Whole lines are read now; the rest waits for the next piece.
+    const void* lastNewline = memrchr(buf.data(), '\n', have);
+    if (!lastNewline) continue;
+    const std::size_t whole = static_cast<std::size_t>(static_cast<const char*>(lastNewline) - buf.data()) + 1;
+    if (!reader->feed(std::string_view(buf.data(), whole))) {
+      close(fd);
+      reader->finish();
+      return false;
+    }
+    std::memmove(buf.data(), buf.data() + whole, have - whole);
+    have -= whole;
+  }
+  close(fd);
+  if (!reader) {
+    // Nothing could be read: readInputText says why, or reads what is there.
+    return false;
+  }
+  if (failure != 0) {
+    reader->finish();
+    error.file = path;
+    error.line = 0;
+    error.message = std::string("cannot read: ") + strerror(failure);
+    return false;
+  }
+  // The last line, which may lack its newline.
+  bool ok = reader->feed(std::string_view(buf.data(), have));
+  return reader->finish() && ok;
+}
+
 InputFormat detectFormat(const std::string& text) {
   size_t i = text.find_first_not_of(" \t\r\n");
   if (i == std::string::npos) return InputFormat::unknown;

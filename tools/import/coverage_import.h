@@ -4,7 +4,9 @@
 #pragma once
 
 #include <algorithm>
+#include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <stdexcept>
 #include <string>
 #include <string_view>
@@ -444,3 +446,26 @@ bool readLcovTracefile(const std::string& name, const std::string& text, Importe
                        ImportError& error);
 bool readGcovJson(const std::string& name, const std::string& text, ImportedData& data,
                   ImportError& error);
+
+// A tracefile read piece by piece: each piece ends where a line does, except the last one
+// of the input, whose final line may lack its newline. After a failure (false, with the
+// error) the rest is not read; finish() ends the input, as readLcovTracefile does.
+class LcovTracefileReader {
+ public:
+  // sizeHint: about how many bytes the input holds.
+  LcovTracefileReader(const std::string& name, ImportedData& data, ImportError& error, std::size_t sizeHint);
+  ~LcovTracefileReader();
+  LcovTracefileReader(const LcovTracefileReader&) = delete;
+  LcovTracefileReader& operator=(const LcovTracefileReader&) = delete;
+  bool feed(std::string_view wholeLines);
+  bool finish();
+
+ private:
+  struct State;
+  std::unique_ptr<State> s_;
+};
+
+// A plain (not compressed) lcov tracefile is parsed as it is read, a few megabytes at a
+// time, so that its text is never held whole. handled false: the input is no such file (or
+// its format cannot be told from its start), and nothing was read into `data`.
+bool readPlainTracefile(const std::string& path, ImportedData& data, ImportError& error, bool& handled);

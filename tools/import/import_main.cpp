@@ -143,8 +143,14 @@ int main(int argc, char** argv) {
       if (!ok) return fail(error);
       continue;
     }
-    std::string text;
     ImportError error;
+    bool handled = false;
+    bool streamed = readPlainTracefile(input, data, error, handled);
+    if (handled) {
+      if (!streamed) return fail(error.text());
+      continue;
+    }
+    std::string text;
     if (!readInputText(input, text, error)) return fail(error.text());
     bool ok = false;
     switch (detectFormat(text)) {

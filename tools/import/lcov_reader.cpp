@@ -322,20 +322,33 @@ struct Parser {
 
 }  // namespace
 
-bool readLcovTracefile(const std::string& name, const std::string& text, ImportedData& data,
-                       ImportError& error) {
-  Parser p{name, data, error, 0, nullptr, {}, {}, false};
+struct LcovTracefileReader::State {
+  State(const std::string& name, ImportedData& data, ImportError& error)
+      : name(name), p{this->name, data, error, 0, nullptr, {}, {}, false} {}
+  std::string name;
+  Parser p;
+  bool ok = true;
+};
+
+LcovTracefileReader::LcovTracefileReader(const std::string& name, ImportedData& data, ImportError& error,
+                                         std::size_t sizeHint)
+    : s_(std::make_unique<State>(name, data, error)) {
   // Room for as many files as a tracefile of this size may well hold (a record takes a few
   // hundred bytes at least): moving the files as the list grows costs more than room that
   // is never touched.
-  data.files.reserve(data.files.size() + text.size() / 256);
+  data.files.reserve(data.files.size() + sizeHint / 256);
+}
+
+LcovTracefileReader::~LcovTracefileReader() = default;
+
+bool LcovTracefileReader::feed(std::string_view text) {
+  Parser& p = s_->p;
   size_t pos = 0;
-  bool ok = true;
   // Lines before the first NUL need no look for one.
   const size_t firstNul = text.find('\0');
   const char* const base = text.data();
   const char* const textEnd = base + text.size();
-  while (ok && pos < text.size()) {
+  while (s_->ok && pos < text.size()) {
     const char* next;
     if (p.quick(base + pos, textEnd, firstNul, base, next)) {
       ++p.lineNo;
@@ -343,26 +356,38 @@ bool readLcovTracefile(const std::string& name, const std::string& text, Importe
       continue;
     }
     size_t nl = text.find('\n', pos);
-    size_t end = nl == std::string::npos ? text.size() : nl;
+    size_t end = nl == std::string_view::npos ? text.size() : nl;
     ++p.lineNo;
     std::string_view line(text.data() + pos, end - pos);
-    if (firstNul != std::string::npos && firstNul < end) {
-      ok = p.fail("binary data in a tracefile");
+    if (firstNul != std::string_view::npos && firstNul < end) {
+      s_->ok = p.fail("binary data in a tracefile");
     } else if (!p.line(line)) {
       // A last line without its newline that does not read is most likely cut short.
-      if (nl == std::string::npos)
-        error.message = "the tracefile looks truncated: its last line '" +
-                        std::string(line.substr(0, 80)) + "' is incomplete (" + error.message + ")";
-      ok = false;
+      if (nl == std::string_view::npos)
+        p.error.message = "the tracefile looks truncated: its last line '" + std::string(line.substr(0, 80)) +
+                          "' is incomplete (" + p.error.message + ")";
+      s_->ok = false;
     }
     pos = end + 1;
   }
+  return s_->ok;
+}
+
+bool LcovTracefileReader::finish() {
+  Parser& p = s_->p;
   if (p.current) p.current->settle();
-  if (ok && p.current) {
+  if (s_->ok && p.current) {
     ++p.lineNo;
-    ok = p.fail("the tracefile looks truncated: its last record has no end_of_record");
+    s_->ok = p.fail("the tracefile looks truncated: its last record has no end_of_record");
   }
   // What was read before a failure stays named as well.
-  data.nameFunctions();
-  return ok;
+  p.data.nameFunctions();
+  return s_->ok;
+}
+
+bool readLcovTracefile(const std::string& name, const std::string& text, ImportedData& data,
+                       ImportError& error) {
+  LcovTracefileReader reader(name, data, error, text.size());
+  reader.feed(text);
+  return reader.finish();
 }
