@@ -417,17 +417,47 @@ std::size_t stepWeight(const ReportStep& s) {
 // this many map entries at a time, each thread's part in memory, and written in order.
 constexpr std::size_t kEntriesPerStretch = std::size_t(1) << 20;
 
+// Joins a thread, if one runs, when it goes out of scope (also when formatting fails).
+class JoinedThread {
+ public:
+  JoinedThread() = default;
+  JoinedThread(const JoinedThread&) = delete;
+  JoinedThread& operator=(const JoinedThread&) = delete;
+  ~JoinedThread() { join(); }
+  void join() {
+    if (thread_.joinable()) thread_.join();
+  }
+  // Runs fn on a thread of its own, or here when no thread can be had.
+  template <class Fn>
+  void run(Fn fn) {
+    join();
+    try {
+      thread_ = std::thread(fn);
+    } catch (const std::system_error&) {
+      fn();
+    }
+  }
+
+ private:
+  std::thread thread_;
+};
+
 ErrorCode writeStepsInParallel(GuardedWriter& w, const std::vector<ReportStep>& steps, const SumRoot& root,
                                MessageSink& messages) {
   const unsigned threads = std::max(1u, std::min(4u, std::thread::hardware_concurrency()));
-  std::vector<TextPart> parts(threads);
+  // Two sets of parts: one stretch is written out from one set while the next is formatted
+  // into the other, so that a report going to a file or a pipe waits little on the writes.
+  std::vector<TextPart> parts[2] = {std::vector<TextPart>(threads), std::vector<TextPart>(threads)};
   std::vector<MessageList> notices(threads);
   std::vector<std::unique_ptr<LazyLineStates>> lineStates;
   for (unsigned t = 0; t < threads; ++t)
     lineStates.push_back(std::make_unique<LazyLineStates>(adjustmentList(), root.hitsPolicy, notices[t], false));
   std::vector<char> failed(threads, 0);
+  JoinedThread writer;  // the writes of the last stretch formatted; only it uses `w` meanwhile
+  bool writeFailed = false;
+  int set = 0;
   std::size_t from = 0;
-  while (from < steps.size() && !w.failed()) {
+  while (from < steps.size() && !writeFailed) {
     // The stretch, cut into one contiguous part per thread of about equal weight.
     std::size_t to = from, weight = 0;
     while (to < steps.size() && weight < kEntriesPerStretch) weight += stepWeight(steps[to++]);
@@ -439,25 +469,24 @@ ErrorCode writeStepsInParallel(GuardedWriter& w, const std::vector<ReportStep>& 
     }
     while (cuts.size() <= threads) cuts.push_back(to);
     cuts.back() = to;
+    std::vector<TextPart>& into = parts[set];
     auto format = [&](unsigned t) {
       try {
-        GuardedWriter part(parts[t]);
+        GuardedWriter part(into[t]);
         for (std::size_t k = cuts[t]; k < cuts[t + 1]; ++k) writeStep(part, steps[k], *lineStates[t]);
         part.finish();
       } catch (...) {
         failed[t] = 1;
       }
     };
-    std::vector<std::thread> workers;
-    for (unsigned t = 1; t < threads; ++t) {
-      try {
-        workers.emplace_back(format, t);
-      } catch (const std::system_error&) {
-        format(t);  // no thread to be had: formatted here
-      }
+    {
+      std::vector<JoinedThread> workers(threads);
+      for (unsigned t = 1; t < threads; ++t) workers[t].run([&format, t] { format(t); });
+      format(0);
     }
-    format(0);
-    for (std::thread& t : workers) t.join();
+    // The previous stretch is out (or failed) before this one goes.
+    writer.join();
+    writeFailed = w.failed();
     for (unsigned t = 0; t < threads; ++t) {
       if (failed[t]) throw std::bad_alloc();
       for (const MessageList::Message& m : notices[t].messages) {
@@ -468,8 +497,11 @@ ErrorCode writeStepsInParallel(GuardedWriter& w, const std::vector<ReportStep>& 
         }
       }
       notices[t].messages.clear();
-      w.text(parts[t].view());
     }
+    if (!writeFailed) writer.run([&w, &into] {
+      for (const TextPart& part : into) w.text(part.view());
+    });
+    set = 1 - set;
     from = to;
   }
   return allOK;

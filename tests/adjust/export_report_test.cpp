@@ -6,6 +6,8 @@
 #include <csignal>
 #include <cstdlib>
 #include <ctime>
+#include <string>
+#include <thread>
 
 #include "adjust/export_report.h"
 #include "coverage/summary_build.h"
@@ -174,6 +176,49 @@ TEST(ExportWriting, AFullDiskIsAWriteFailure) {
   EXPECT_NE(errorMessage(fileWriteFailed).find("space"), std::string::npos)
       << errorMessage(fileWriteFailed);
   fclose(full);
+}
+
+TEST(ExportWriting, OnSeveralThreadsAReportGoesToAPipeWholeAndStopsAtAFailedWrite) {
+  // Several million map entries: the report is formatted in several stretches, each written
+  // out while the next is formatted.
+  kgtest::TempDir dir;
+  auto data = kgtest::readOk(kgtest::makeKgv(dir, "g.kgv", "generate records=3000 functions=50 blocks=20\n"));
+  std::unique_ptr<SumRoot> root;
+  ASSERT_EQ(buildSummary(*data, 11, hitsMax, {}, gMessages, root, false), allOK);
+  const std::string serial = exportText(*root, 1700000000);
+  ASSERT_GT(serial.size(), std::size_t(40) << 20);
+
+  setSummaryThreadThreshold(0);
+  int fds[2];
+  ASSERT_EQ(pipe(fds), 0);
+  std::string piped;
+  std::thread reader([&] {
+    char buf[1 << 16];
+    for (ssize_t n; (n = read(fds[0], buf, sizeof buf)) > 0;) piped.append(buf, static_cast<std::size_t>(n));
+    close(fds[0]);
+  });
+  FILE* out = fdopen(fds[1], "w");
+  ASSERT_NE(out, nullptr);
+  EXPECT_EQ(writeExport(out, *root, 1700000000, gMessages), allOK);
+  fclose(out);
+  reader.join();
+  EXPECT_TRUE(piped == serial) << "the report written on several threads differs";
+
+  // A disk that fills stops the report with the failure; a reader that goes away does not.
+  if (FILE* full = fopen("/dev/full", "w")) {
+    EXPECT_EQ(writeExport(full, *root, gMessages), fileWriteFailed);
+    clearPendingSystemError();
+    fclose(full);
+  }
+  ASSERT_EQ(pipe(fds), 0);
+  close(fds[0]);
+  FILE* closed = fdopen(fds[1], "w");
+  auto old = signal(SIGPIPE, SIG_IGN);
+  EXPECT_EQ(writeExport(closed, *root, gMessages), allOK);
+  EXPECT_EQ(pendingSystemError(), "");
+  signal(SIGPIPE, old);
+  fclose(closed);
+  setSummaryThreadThreshold(std::size_t(4) << 20);
 }
 
 TEST(ExportWriting, ExportToAFileReplacesItOnlyWhenWhole) {
