@@ -12,6 +12,14 @@
 
 namespace {
 
+// What a comparison sees of a directory, file or function record.
+struct SortKey {
+  const char* name;
+  std::uint32_t nativeIndex;
+  const SumCounts* counts;
+  const void* address;  // last tie-break: position in memory
+};
+
 // Name by bytes, then native index, then place in memory.
 int tieBreak(const SortKey& a, const SortKey& b) {
   int c = std::strcmp(a.name, b.name);
@@ -37,13 +45,6 @@ int ratioDescending(std::uint32_t an, std::uint32_t ad, std::uint32_t bn, std::u
   if (left > right) return -1;
   if (left < right) return 1;
   return 0;
-}
-
-template <int (*Primary)(const SumCounts&, const SumCounts&)>
-int withTieBreak(const SortKey& a, const SortKey& b) {
-  if (a.address == b.address) return 0;
-  int c = Primary(*a.counts, *b.counts);
-  return c != 0 ? c : tieBreak(a, b);
 }
 
 int byNothing(const SumCounts&, const SumCounts&) { return 0; }
@@ -89,31 +90,95 @@ int byBUnusedPct(const SumCounts& a, const SumCounts& b) {
   return ratioDescending(a.unusedBlocks, a.blocks, b.unusedBlocks, b.blocks, false);
 }
 
-int byNative(const SortKey& a, const SortKey& b) {
-  if (a.address == b.address) return 0;
-  if (a.nativeIndex != b.nativeIndex) return a.nativeIndex < b.nativeIndex ? -1 : 1;
-  return tieBreak(a, b);
-}
-
 template <typename Record>
 SortKey keyOf(const Record* r) {
   return SortKey{r->name, r->nativeIndex, &r->counts, r};
 }
 
-// The comparison is a template argument, so it is inlined into the sort: a large summary
-// sorts millions of functions.
-template <SortComparison Cmp, typename Record>
+using Primary = int (*)(const SumCounts&, const SumCounts&);
+
+// A function with the eight bytes of its name after the part all names of its file share,
+// as a big-endian number (zeros past its end): most ties between functions are decided by
+// it, without reading the names.
+struct KeyedFunction {
+  SumFunc* fn;
+  std::uint64_t prefix;
+  const char* rest;  // the name after the shared part
+};
+
+std::uint64_t namePrefix(const char* name) {
+  std::uint64_t p = 0;
+  int i = 0;
+  for (; i < 8 && name[i] != '\0'; ++i) p = p << 8 | static_cast<unsigned char>(name[i]);
+  return i == 0 ? 0 : p << (8 * (8 - i));
+}
+
+// An order: by native index first (NativeFirst) or by the counts' comparison, then by the
+// common tie-break. Both comparisons are template arguments, so that they are inlined into
+// the sorts: a large summary sorts millions of functions.
+template <Primary ByCounts, bool NativeFirst>
+struct Order {
+  static int compare(const SortKey& a, const SortKey& b) {
+    if (a.address == b.address) return 0;
+    if constexpr (NativeFirst) {
+      if (a.nativeIndex != b.nativeIndex) return a.nativeIndex < b.nativeIndex ? -1 : 1;
+    } else {
+      if (int c = ByCounts(*a.counts, *b.counts); c != 0) return c;
+    }
+    return tieBreak(a, b);
+  }
+
+  // The same order as compare() gives the functions' keys.
+  static bool functionBefore(const KeyedFunction& a, const KeyedFunction& b) {
+    if (a.fn == b.fn) return false;
+    if constexpr (NativeFirst) {
+      if (a.fn->nativeIndex != b.fn->nativeIndex) return a.fn->nativeIndex < b.fn->nativeIndex;
+    } else {
+      if (int c = ByCounts(a.fn->counts, b.fn->counts); c != 0) return c < 0;
+    }
+    if (a.prefix != b.prefix) return a.prefix < b.prefix;
+    // Equal first bytes: names of eight bytes or more go on, shorter ones are equal.
+    if ((a.prefix & 0xFF) != 0) {
+      if (int c = std::strcmp(a.rest + 8, b.rest + 8); c != 0) return c < 0;
+    }
+    if (a.fn->nativeIndex != b.fn->nativeIndex) return a.fn->nativeIndex < b.fn->nativeIndex;
+    return std::less<const void*>()(a.fn, b.fn);
+  }
+};
+
+template <class O, typename Record>
 void sortLevel(std::vector<Record*>& order) {
   if (order.size() < 2) return;
-  std::sort(order.begin(), order.end(), [](const Record* a, const Record* b) { return Cmp(keyOf(a), keyOf(b)) < 0; });
+  std::sort(order.begin(), order.end(),
+            [](const Record* a, const Record* b) { return O::compare(keyOf(a), keyOf(b)) < 0; });
+}
+
+template <class O>
+void sortFunctionsBy(std::vector<SumFunc*>& order) {
+  if (order.size() < 2) return;
+  // Kept from file to file on each thread.
+  thread_local std::vector<KeyedFunction> keyed;
+  keyed.clear();
+  // Names of one file often begin alike (a namespace, a prefix): the part all share decides
+  // nothing between them.
+  const char* first = order[0]->name;
+  std::size_t shared = std::strlen(first);
+  for (const SumFunc* fn : order) {
+    std::size_t i = 0;
+    while (i < shared && fn->name[i] == first[i]) ++i;
+    shared = i;
+  }
+  for (SumFunc* fn : order) keyed.push_back(KeyedFunction{fn, namePrefix(fn->name + shared), fn->name + shared});
+  std::sort(keyed.begin(), keyed.end(), O::functionBefore);
+  for (std::size_t k = 0; k < keyed.size(); ++k) order[k] = keyed[k].fn;
 }
 
 std::size_t gFunctionsForThreads = std::size_t(256) << 10;
 
-template <SortComparison Cmp>
+template <class O>
 void sortTree(SumRoot& root, bool functionsToo) {
-  sortLevel<Cmp>(root.dirOrder);
-  for (SumDir* d : root.dirOrder) sortLevel<Cmp>(d->fileOrder);
+  sortLevel<O>(root.dirOrder);
+  for (SumDir* d : root.dirOrder) sortLevel<O>(d->fileOrder);
   if (!functionsToo) return;
   // Each file's functions are sorted apart from the others': many files, on a few threads.
   try {
@@ -122,37 +187,36 @@ void sortTree(SumRoot& root, bool functionsToo) {
     runInParallel(
         files.size(), [&](std::size_t k) { return files[k]->funcOrder.size(); }, gFunctionsForThreads,
         [&](std::size_t from, std::size_t to) {
-          for (std::size_t k = from; k < to; ++k) sortLevel<Cmp>(files[k]->funcOrder);
+          for (std::size_t k = from; k < to; ++k) sortFunctionsBy<O>(files[k]->funcOrder);
         });
   } catch (const std::bad_alloc&) {
-    // No room for the list of files: one file after the other.
+    // No room for the list of files: one file after the other, without keys.
     for (SumDir* d : root.dirOrder)
-      for (SumFile* f : d->fileOrder) sortLevel<Cmp>(f->funcOrder);
+      for (SumFile* f : d->fileOrder) sortLevel<O>(f->funcOrder);
   }
 }
 
-// Calls fn.template operator()<Cmp>() with the comparison of the order; false for an id
-// outside 1..17.
+// Calls fn.template operator()<O>() with the Order of the id; false for an id outside 1..17.
 template <typename Fn>
 bool withComparison(std::uint32_t sortOrder, Fn fn) {
   switch (sortOrder) {
-    case 1: fn.template operator()<withTieBreak<byNothing>>(); break;
-    case 2: fn.template operator()<byNative>(); break;
-    case 3: fn.template operator()<withTieBreak<byLines>>(); break;
-    case 4: fn.template operator()<withTieBreak<byLUsed>>(); break;
-    case 5: fn.template operator()<withTieBreak<byLUsedPct>>(); break;
-    case 6: fn.template operator()<withTieBreak<byLUnused>>(); break;
-    case 7: fn.template operator()<withTieBreak<byLUnusedPct>>(); break;
-    case 8: fn.template operator()<withTieBreak<byAdjLines>>(); break;
-    case 9: fn.template operator()<withTieBreak<byAlUsed>>(); break;
-    case 10: fn.template operator()<withTieBreak<byAlUsedPct>>(); break;
-    case 11: fn.template operator()<withTieBreak<byAlUnused>>(); break;
-    case 12: fn.template operator()<withTieBreak<byAlUnusedPct>>(); break;
-    case 13: fn.template operator()<withTieBreak<byBlocks>>(); break;
-    case 14: fn.template operator()<withTieBreak<byBUsed>>(); break;
-    case 15: fn.template operator()<withTieBreak<byBUsedPct>>(); break;
-    case 16: fn.template operator()<withTieBreak<byBUnused>>(); break;
-    case 17: fn.template operator()<withTieBreak<byBUnusedPct>>(); break;
+    case 1: fn.template operator()<Order<byNothing, false>>(); break;
+    case 2: fn.template operator()<Order<byNothing, true>>(); break;
+    case 3: fn.template operator()<Order<byLines, false>>(); break;
+    case 4: fn.template operator()<Order<byLUsed, false>>(); break;
+    case 5: fn.template operator()<Order<byLUsedPct, false>>(); break;
+    case 6: fn.template operator()<Order<byLUnused, false>>(); break;
+    case 7: fn.template operator()<Order<byLUnusedPct, false>>(); break;
+    case 8: fn.template operator()<Order<byAdjLines, false>>(); break;
+    case 9: fn.template operator()<Order<byAlUsed, false>>(); break;
+    case 10: fn.template operator()<Order<byAlUsedPct, false>>(); break;
+    case 11: fn.template operator()<Order<byAlUnused, false>>(); break;
+    case 12: fn.template operator()<Order<byAlUnusedPct, false>>(); break;
+    case 13: fn.template operator()<Order<byBlocks, false>>(); break;
+    case 14: fn.template operator()<Order<byBUsed, false>>(); break;
+    case 15: fn.template operator()<Order<byBUsedPct, false>>(); break;
+    case 16: fn.template operator()<Order<byBUnused, false>>(); break;
+    case 17: fn.template operator()<Order<byBUnusedPct, false>>(); break;
     default: return false;
   }
   return true;
@@ -164,11 +228,15 @@ void setSortThreadThreshold(std::size_t functions) { gFunctionsForThreads = func
 
 ErrorCode sortSummary(SumRoot& root, std::uint32_t sortOrder, bool functionsToo) {
   // Any other id leaves the tree as it is.
-  if (withComparison(sortOrder, [&]<SortComparison Cmp>() { sortTree<Cmp>(root, functionsToo); }))
+  if (withComparison(sortOrder, [&]<class O>() { sortTree<O>(root, functionsToo); }))
     root.sortOrder = sortOrder;
   return allOK;
 }
 
 void sortFunctions(SumFile& file, std::uint32_t sortOrder) {
-  withComparison(sortOrder, [&]<SortComparison Cmp>() { sortLevel<Cmp>(file.funcOrder); });
+  try {
+    withComparison(sortOrder, [&]<class O>() { sortFunctionsBy<O>(file.funcOrder); });
+  } catch (const std::bad_alloc&) {
+    withComparison(sortOrder, [&]<class O>() { sortLevel<O>(file.funcOrder); });  // without keys
+  }
 }

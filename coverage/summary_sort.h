@@ -7,17 +7,6 @@
 #include "coverage/summary_types.h"
 #include "support/errors.h"
 
-// What a comparison sees of a directory, file or function record.
-struct SortKey {
-  const char* name;
-  std::uint32_t nativeIndex;
-  const SumCounts* counts;
-  const void* address;  // last tie-break: position in memory
-};
-
-// Negative when a comes first, positive when b does, 0 for the same record.
-using SortComparison = int (*)(const SortKey& a, const SortKey& b);
-
 // Sorts dirOrder, every fileOrder and (unless functionsToo is false: they were sorted file by
 // file) every funcOrder by the order and stores it in the root. Ids outside 1..17 leave the
 // tree as it is.

@@ -409,6 +409,37 @@ TEST(SummarySort, FunctionsOfEqualNameAndCountsGoByTheirPlaceInTheMap) {
   EXPECT_EQ(f.funcOrder[2], &f.functions[2]);
 }
 
+TEST(SummarySort, FunctionsOfEqualCountsGoByTheirNamesBytesWhateverTheirLengths) {
+  // Names alike in their first eight bytes and beyond, shorter and longer, a byte above 127,
+  // and two of one name; every function has the same counts. Then all of them with a long
+  // part in common in front.
+  const std::vector<std::string> plain = {"abcdefghij", "abcdefgh", "zz", "abcdefgi", "abcdefghi", "a",
+                                          "abcdefg", "\xc3\xa9t\xc3\xa9", "abcdefgh2", "ABCDEFGH", "abcdefghij", "abcdefgh10"};
+  for (const std::string& shared : {std::string(), std::string("mylib::detail::"), std::string("abcdefg")}) {
+    std::vector<std::string> names;
+    for (const std::string& n : plain) names.push_back(shared + n);
+    std::string text = "record t.c\n";
+    for (std::size_t k = 0; k < names.size(); ++k)
+      text += "function " + names[k] + " line=" + std::to_string(10 * k + 1) + " calls=1\nblock " +
+              std::to_string(10 * k + 2) + " hits=0\n";
+    auto b = build(text);
+    ASSERT_EQ(b->rc, allOK);
+    const SumFile& f = onlyFile(*b->root);
+    ASSERT_EQ(f.functions.size(), names.size());
+    // By bytes (as unsigned), then by place in the map.
+    std::vector<std::size_t> byName(names.size());
+    for (std::size_t k = 0; k < byName.size(); ++k) byName[k] = k;
+    std::stable_sort(byName.begin(), byName.end(), [&](std::size_t x, std::size_t y) { return names[x] < names[y]; });
+    for (std::uint32_t id = 1; id <= 17; ++id) {
+      ASSERT_EQ(sortSummary(*b->root, id), allOK);
+      for (std::size_t k = 0; k < names.size(); ++k) {
+        const std::size_t expected = id == 2 ? k : byName[k];  // native order first
+        EXPECT_EQ(f.funcOrder[k], &f.functions[expected]) << sort_order_name(id) << " place " << k << " " << shared;
+      }
+    }
+  }
+}
+
 TEST(SummarySort, NamesIdsAndLabels) {
   std::uint32_t id = 0;
   EXPECT_EQ(sort_order_by_name("l_used%", id), allOK);
