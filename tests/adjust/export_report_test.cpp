@@ -152,20 +152,30 @@ TEST_F(InUtc, TheReportFollowsTheTreesSortOrder) {
   EXPECT_GT(text.find("di\tsrc/"), text.find("di\t**no_directory_provided**/"));
 }
 
+namespace {
+
+// A report into a pipe whose reader has gone: no failure and no error left pending.
+void expectNoFailureWhenTheReaderLeaves(const SumRoot& root) {
+  int fds[2];
+  ASSERT_EQ(pipe(fds), 0);
+  close(fds[0]);
+  FILE* w = fdopen(fds[1], "w");
+  ASSERT_NE(w, nullptr);
+  auto old = signal(SIGPIPE, SIG_IGN);
+  EXPECT_EQ(writeExport(w, root, gMessages), allOK);
+  EXPECT_EQ(pendingSystemError(), "");
+  signal(SIGPIPE, old);
+  fclose(w);
+}
+
+}  // namespace
+
 TEST(ExportWriting, AReaderThatClosesItsEndEarlyIsNoFailure) {
   kgtest::TempDir dir;
   auto data = kgtest::readOk(kgtest::makeKgv(dir, "g.kgv", "generate records=300 functions=5 blocks=8\n"));
   std::unique_ptr<SumRoot> root;
   ASSERT_EQ(buildSummary(*data, 1, hitsMax, {}, gMessages, root), allOK);
-  int fds[2];
-  ASSERT_EQ(pipe(fds), 0);
-  close(fds[0]);
-  FILE* w = fdopen(fds[1], "w");
-  auto old = signal(SIGPIPE, SIG_IGN);
-  EXPECT_EQ(writeExport(w, *root, gMessages), allOK);
-  EXPECT_EQ(pendingSystemError(), "");
-  signal(SIGPIPE, old);
-  fclose(w);
+  expectNoFailureWhenTheReaderLeaves(*root);
 }
 
 TEST(ExportWriting, AFullDiskIsAWriteFailure) {
@@ -210,14 +220,7 @@ TEST(ExportWriting, OnSeveralThreadsAReportGoesToAPipeWholeAndStopsAtAFailedWrit
     clearPendingSystemError();
     fclose(full);
   }
-  ASSERT_EQ(pipe(fds), 0);
-  close(fds[0]);
-  FILE* closed = fdopen(fds[1], "w");
-  auto old = signal(SIGPIPE, SIG_IGN);
-  EXPECT_EQ(writeExport(closed, *root, gMessages), allOK);
-  EXPECT_EQ(pendingSystemError(), "");
-  signal(SIGPIPE, old);
-  fclose(closed);
+  expectNoFailureWhenTheReaderLeaves(*root);
   setSummaryThreadThreshold(std::size_t(4) << 20);
 }
 
