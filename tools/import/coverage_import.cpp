@@ -332,24 +332,29 @@ PathIndex::iterator PathIndex::find(std::string_view name) const {
   return iterator(Entry{std::string_view(bytes_.data() + s.offset, s.length), s.value});
 }
 
-bool PathIndex::emplace(std::string_view name, size_t value) {
+size_t PathIndex::findOrAdd(std::string_view name, size_t value) {
   if (2 * (size_ + 1) > slots_.size()) grow(slots_.empty() ? 16 : 2 * slots_.size());
   std::uint64_t hash = std::hash<std::string_view>()(name);
   Slot& s = slots_[slotOf(name, hash)];
-  if (s.value != kEmpty) return false;
+  if (s.value != kEmpty) return s.value;
   s.hash = hash;
   s.offset = bytes_.size();
   s.length = static_cast<std::uint32_t>(name.size());
   s.value = static_cast<std::uint32_t>(value);
   bytes_.append(name);
   ++size_;
-  return true;
+  return value;
+}
+
+bool PathIndex::emplace(std::string_view name, size_t value) {
+  const size_t before = size_;
+  findOrAdd(name, value);
+  return size_ != before;
 }
 
 ImportedFile& ImportedData::file(std::string path) {
-  auto it = fileIndex.find(path);
-  if (it != fileIndex.end()) return files[it->second];
-  fileIndex.emplace(path, files.size());
+  const size_t at = fileIndex.findOrAdd(path, files.size());
+  if (at != files.size()) return files[at];
   files.emplace_back();
   files.back().path = std::move(path);
   return files.back();
