@@ -348,6 +348,26 @@ TEST(Layout, FunctionsSharingTheirFirstLineGiveItsLinesToTheLastOfThem) {
   }
 }
 
+TEST(Layout, FunctionsGivenInAnyOrderAreLaidOutByLineThenName) {
+  // Few and many functions, given backwards, two of them on each line.
+  for (int count : {6, 40}) {
+    ImportedFile f;
+    f.path = "/s/many.c";
+    std::vector<std::pair<std::uint32_t, std::string>> expected;
+    for (int k = count - 1; k >= 0; --k) {
+      const std::string name = std::string(k % 2 ? "b" : "a") + std::to_string(k);
+      ImportedFunction& fn = f.function(name);
+      fn.startLine = 10 * static_cast<std::uint32_t>(k / 2) + 1;
+      f.addLine(fn.startLine + 1, 1);
+      expected.emplace_back(fn.startLine, name);
+    }
+    std::sort(expected.begin(), expected.end());
+    LaidOutRecord r = layOutRecord(f);
+    ASSERT_EQ(r.functions.size(), expected.size()) << count;
+    for (std::size_t k = 0; k < expected.size(); ++k) EXPECT_EQ(r.functions[k].name, expected[k].second) << count;
+  }
+}
+
 TEST(Inputs, ImportsAddedTogetherEqualOneImportOfAllInputs) {
   const char* a = "SF:/s/a.c\nFN:1,_Z1fv\nFNDA:2,_Z1fv\nDA:2,2\nBRDA:2,0,0,1\nend_of_record\n";
   const char* b = "SF:/s/a.c\nFN:1,_Z1fv\nFN:5,_Z1gv\nFNDA:1,_Z1fv\nDA:2,1\nDA:6,0\nBRDA:2,0,1,1\nend_of_record\n";

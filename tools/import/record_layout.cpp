@@ -56,10 +56,20 @@ void planLayout(const ImportedFile& file, LayoutPlan& plan) {
   std::vector<const ImportedFunction*>& funcs = plan.functions;
   funcs.clear();
   for (const auto& f : file.functions) funcs.push_back(&f);
-  std::stable_sort(funcs.begin(), funcs.end(), [](const ImportedFunction* a, const ImportedFunction* b) {
+  auto before = [](const ImportedFunction* a, const ImportedFunction* b) {
     if (a->startLine != b->startLine) return a->startLine < b->startLine;
     return a->name < b->name;
-  });
+  };
+  // Most files list their functions in line order already, and most have a few: stable_sort
+  // would take a buffer from the heap for each file.
+  if (!std::is_sorted(funcs.begin(), funcs.end(), before)) {
+    if (funcs.size() > 32) {
+      std::stable_sort(funcs.begin(), funcs.end(), before);
+    } else {
+      for (size_t i = 1; i < funcs.size(); ++i)
+        for (size_t j = i; j > 0 && before(funcs[j], funcs[j - 1]); --j) std::swap(funcs[j], funcs[j - 1]);
+    }
+  }
 
   // One range per group of functions starting on one line. Known ends are used as they
   // are; otherwise the group reaches to the line before the next function that starts
