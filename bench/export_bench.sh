@@ -61,12 +61,12 @@ marked_lines=$("$BUILD/bin/kestrel" -export "-adjustmentfilename=$WORK/adjust" "
 read -r merge_s merge_kb merge_cpu < <(best "$BUILD/bin/kestrel" "-merge=$WORK/merged.kgv" "${inputs[@]}")
 read -r export_s export_kb export_cpu < <(best bash -c 'run_export "$@"' bash "${inputs[@]}")
 
-awk -v b="$bytes" -v ms="$merge_s" -v mk="$merge_kb" -v mc="$merge_cpu" -v es="$export_s" \
+awk -v runs="$RUNS" -v b="$bytes" -v ms="$merge_s" -v mk="$merge_kb" -v mc="$merge_cpu" -v es="$export_s" \
     -v ek="$export_kb" -v ec="$export_cpu" -v rb="$report_bytes" -v n="$((FILES + 1))" \
     -v marked="$marked_lines" '
   BEGIN {
     printf "export_bench: %d files, %.1f MB in, report %.1f MB, %d tested/inspected lines shown\n", n, b / 1e6, rb / 1e6, marked
-    printf "  (best of three runs; CPU = user + system time)\n"
+    printf "  (best of %d runs; CPU = user + system time)\n", runs
     printf "  merge:  %6.2f s  (CPU %.2f s)  peak memory %.1f MB\n", ms, mc, mk * 1024 / 1e6
     printf "  export: %6.2f s  (CPU %.2f s)  peak memory %.1f MB\n", es, ec, ek * 1024 / 1e6
     ratio = ms > 0 ? es / ms : 0

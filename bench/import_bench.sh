@@ -84,7 +84,7 @@ if ! lcov -q --summary "$WORK/small.info" >/dev/null 2>&1; then echo "import_ben
 rm -f "$WORK/probe.kgv"
 
 . "$(dirname "$0")/timing.inc"
-echo "import_bench: best of three runs of each; files in $WORK"
+echo "import_bench: best of $RUNS runs of each; files in $WORK"
 report() {  # NAME INPUT TARGET_MBPS
   local name=$1 input=$WORK/$2 target=$3 s kb cpu bytes
   bytes=$(wc -c <"$input")

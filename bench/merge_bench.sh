@@ -41,12 +41,12 @@ rm -f "$WORK/cat.out"
 read -r merge_s merge_kb merge_cpu < <(best "${merge[@]}" "-merge=$WORK/merged.kgv" "${inputs[@]}")
 out_bytes=$(wc -c <"$WORK/merged.kgv")
 
-awk -v b="$bytes" -v cs="$cat_s" -v ms="$merge_s" -v mk="$merge_kb" -v ob="$out_bytes" -v n="$FILES" \
+awk -v runs="$RUNS" -v b="$bytes" -v cs="$cat_s" -v ms="$merge_s" -v mk="$merge_kb" -v ob="$out_bytes" -v n="$FILES" \
     -v cc="$cat_cpu" -v mc="$merge_cpu" -v dir="$WORK" '
   function mbps(s) { return s > 0 ? b / 1e6 / s : 1e9 }
   BEGIN {
     printf "merge_bench: %d files, %.1f MB in, merged output %.1f MB\n", n, b / 1e6, ob / 1e6
-    printf "  (files in %s; best of three runs; CPU = user + system time)\n", dir
+    printf "  (files in %s; best of %d runs; CPU = user + system time)\n", dir, runs
     printf "  cat:   %6.2f s  %8.1f MB/s  (CPU %.2f s)\n", cs, mbps(cs), cc
     printf "  merge: %6.2f s  %8.1f MB/s  (CPU %.2f s)  peak memory %.1f MB\n", ms, mbps(ms), mc, mk * 1024 / 1e6
     ratio = mbps(ms) / mbps(cs)
