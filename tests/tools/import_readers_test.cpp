@@ -479,6 +479,55 @@ TEST(Inputs, APlainTracefileReadInPiecesReadsAsTheWholeText) {
   }
 }
 
+TEST(Inputs, ALargeTracefileReadInTwoHalvesReadsAsTheWholeText) {
+  // Records of many files, then again some of the first ones with other counts and one more
+  // function each: those are in both halves.
+  auto record = [](int f, int round) {
+    std::string r = "TN:t\nSF:/src/d" + std::to_string(f % 7) + "/f" + std::to_string(f) + ".c\n";
+    r += "FN:1,fn" + std::to_string(f) + "\nFNDA:" + std::to_string(f % 3 + round) + ",fn" + std::to_string(f) + "\n";
+    if (round) r += "FN:95,late" + std::to_string(f) + "\nFNDA:1,late" + std::to_string(f) + "\nDA:96,1\n";
+    for (int l = 1; l < 90; l += 2) {
+      r += "DA:" + std::to_string(l) + "," + std::to_string((l * f + round) % 5) + "\n";
+      if (l % 10 == 1) r += "BRDA:" + std::to_string(l) + ",0," + std::to_string(round) + "," + std::to_string(f % 4) + "\n";
+    }
+    return r + "end_of_record\n";
+  };
+  std::string text;
+  int files = 0;
+  while (text.size() < (std::size_t(9) << 20)) text += record(files++, 0);
+  for (int f = 0; f < 50; ++f) text += record(f, 1);
+  kgtest::TempDir dir;
+  const std::string path = dir.file("large.info");
+  kgtest::writeFile(path, text);
+  const std::uint64_t half = tracefileSecondHalf(path);
+  ASSERT_GT(half, text.size() / 2);  // this file is read in two halves
+  ASSERT_LT(half, text.size());
+  ImportedData whole, halves;
+  ImportError e;
+  ASSERT_TRUE(readLcovTracefile(path, text, whole, e)) << e.text();
+  bool handled = false;
+  ASSERT_TRUE(readPlainTracefile(path, halves, e, handled)) << e.text();
+  ASSERT_EQ(halves.files.size(), static_cast<std::size_t>(files));
+  expectSameRecords(*recordsOf(whole), *recordsOf(halves));
+
+  // Bad lines: in the second half only, in both (the first counts), a cut-short end.
+  const std::size_t early = text.find("DA:", std::size_t(1) << 20), late = text.find("DA:", half + 1000);
+  const std::string bad = "DA:x,1\n";
+  for (const std::string& damaged : {text.substr(0, late) + bad + text.substr(late),
+                                     text.substr(0, early) + bad + text.substr(early, late - early) + bad + text.substr(late),
+                                     text.substr(0, text.size() - 20)}) {
+    kgtest::writeFile(path, damaged);
+    ImportedData d1, d2;
+    ImportError e1, e2;
+    EXPECT_FALSE(readLcovTracefile(path, damaged, d1, e1));
+    EXPECT_FALSE(readPlainTracefile(path, d2, e2, handled));
+    EXPECT_EQ(e1.text(), e2.text());
+  }
+  // A file without a record's end near its middle is read in one.
+  kgtest::writeFile(path, "TN:" + std::string(std::size_t(9) << 20, 'x') + "\n");
+  EXPECT_EQ(tracefileSecondHalf(path), 0u);
+}
+
 TEST(Exclusions, MarkedLinesBranchesAndFunctionsOfGcovDataAreLeftOutAsLcovDoes) {
   kgtest::TempDir dir;
   std::string src = dir.file("x.cc");

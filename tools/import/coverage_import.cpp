@@ -14,7 +14,10 @@
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
+#include <exception>
 #include <string_view>
+#include <system_error>
+#include <thread>
 #include <type_traits>
 
 static_assert(std::is_nothrow_move_constructible_v<ImportedFile>,
@@ -365,22 +368,43 @@ void ImportedData::nameFunctions() {
     if (f.namesDue) nameFileFunctions(f);
 }
 
-void addImportedData(ImportedData& into, const ImportedData& from) {
-  for (const ImportedFile& src : from.files) {
-    ImportedFile& dst = into.file(src.path);
-    for (const ImportedFunction& f : src.functions) {
-      ImportedFunction& g = dst.function(f.key);
-      if (g.startLine == 0) g.startLine = f.startLine;
-      if (g.endLine == 0) g.endLine = f.endLine;
-      g.calls = addCounts(g.calls, f.calls);
-    }
-    for (const auto& [line, hits] : src.lines) dst.addLine(line, hits);
-    for (const auto& [line, outcomes] : src.branches)
-      for (const auto& [key, taken] : outcomes) dst.addBranch(line, key, taken);
-    dst.settle();
-    dst.runs = addCounts(dst.runs, src.runs);
-    dst.fromGcov = dst.fromGcov || src.fromGcov;
+namespace {
+
+void addImportedFile(ImportedFile& dst, const ImportedFile& src) {
+  for (const ImportedFunction& f : src.functions) {
+    ImportedFunction& g = dst.function(f.key);
+    if (g.startLine == 0) g.startLine = f.startLine;
+    if (g.endLine == 0) g.endLine = f.endLine;
+    g.calls = addCounts(g.calls, f.calls);
   }
+  for (const auto& [line, hits] : src.lines) dst.addLine(line, hits);
+  for (const auto& [line, outcomes] : src.branches)
+    for (const auto& [key, taken] : outcomes) dst.addBranch(line, key, taken);
+  dst.settle();
+  dst.runs = addCounts(dst.runs, src.runs);
+  dst.fromGcov = dst.fromGcov || src.fromGcov;
+}
+
+}  // namespace
+
+void addImportedData(ImportedData& into, const ImportedData& from) {
+  for (const ImportedFile& src : from.files) addImportedFile(into.file(src.path), src);
+  into.nameFunctions();
+}
+
+void addImportedData(ImportedData& into, ImportedData&& from) {
+  for (ImportedFile& src : from.files) {
+    // A file new to `into` is taken over whole: adding its parts to an empty file would
+    // give the same.
+    const size_t at = into.fileIndex.findOrAdd(src.path, into.files.size());
+    if (at == into.files.size()) {
+      src.settle();
+      into.files.push_back(std::move(src));
+    } else {
+      addImportedFile(into.files[at], src);
+    }
+  }
+  from = ImportedData();
   into.nameFunctions();
 }
 
@@ -560,70 +584,166 @@ namespace {
 
 // Pieces of a tracefile read at a time; a line longer than this grows the buffer.
 constexpr std::size_t kTracefilePiece = std::size_t(4) << 20;
+// Tracefiles of this size and more are read as two halves on two threads.
+constexpr std::uint64_t kTracefileHalves = std::uint64_t(8) << 20;
+
+// Reads bytes from..to of the file (to: UINT64_MAX for its end) and feeds their whole lines
+// to the reader, the rest of the last line at the end. False on a bad line (the reader's
+// error) or a failed read (readErrno set).
+bool feedRange(int fd, std::uint64_t from, std::uint64_t to, LcovTracefileReader& reader, int& readErrno) {
+  std::string buf(kTracefilePiece, '\0');
+  std::size_t have = 0;  // bytes in buf not yet fed
+  std::uint64_t at = from;
+  for (;;) {
+    if (have == buf.size()) buf.resize(2 * buf.size());  // a line longer than the buffer
+    std::size_t want = buf.size() - have;
+    if (to != UINT64_MAX) want = static_cast<std::size_t>(std::min<std::uint64_t>(want, to - at));
+    if (want == 0) break;
+    ssize_t got = pread(fd, buf.data() + have, want, static_cast<off_t>(at));
+    if (got < 0 && errno == EINTR) continue;
+    if (got < 0) {
+      readErrno = errno;
+      return false;
+    }
+    if (got == 0) break;
+    at += static_cast<std::uint64_t>(got);
+    have += static_cast<std::size_t>(got);
+    // Whole lines are read now; the rest waits for the next piece.
+    const void* lastNewline = memrchr(buf.data(), '\n', have);
+    if (!lastNewline) continue;
+    const std::size_t whole = static_cast<std::size_t>(static_cast<const char*>(lastNewline) - buf.data()) + 1;
+    if (!reader.feed(std::string_view(buf.data(), whole))) return false;
+    std::memmove(buf.data(), buf.data() + whole, have - whole);
+    have -= whole;
+  }
+  // The last line, which may lack its newline.
+  return reader.feed(std::string_view(buf.data(), have));
+}
+
+// Bytes from..to of the file as a whole input (ended with finish()): false with the error.
+// linesRead: how many lines were read.
+bool readRange(int fd, std::uint64_t from, std::uint64_t to, const std::string& path, ImportedData& data,
+               ImportError& error, std::uint64_t& linesRead) {
+  const std::uint64_t size = to == UINT64_MAX ? 0 : to - from;
+  LcovTracefileReader reader(path, data, error, static_cast<std::size_t>(size));
+  int readErrno = 0;
+  const bool fed = feedRange(fd, from, to, reader, readErrno);
+  const bool finished = reader.finish();
+  linesRead = reader.linesRead();
+  if (readErrno != 0) {
+    // A read that failed is the reason, not the record it cut short.
+    error.file = path;
+    error.line = 0;
+    error.message = std::string("cannot read: ") + strerror(readErrno);
+    return false;
+  }
+  return fed && finished;
+}
+
+// Where the second half of a tracefile may begin: just after an "end_of_record" line at or
+// past the middle, where a reader of the whole file holds no record; 0 where none is near.
+std::uint64_t secondHalf(int fd, std::uint64_t size) {
+  static const char kEnd[] = "\nend_of_record\n";
+  std::string window(std::size_t(1) << 20, '\0');
+  const std::uint64_t from = size / 2;
+  ssize_t got;
+  do got = pread(fd, window.data(), window.size(), static_cast<off_t>(from));
+  while (got < 0 && errno == EINTR);
+  if (got <= 0) return 0;
+  const std::size_t found = std::string_view(window.data(), static_cast<std::size_t>(got)).find(kEnd);
+  if (found == std::string_view::npos) return 0;
+  const std::uint64_t split = from + found + sizeof kEnd - 1;
+  return split < size ? split : 0;
+}
+
+// A bad line of the second half is at its place in the whole file.
+void inWholeFile(ImportError& error, std::uint64_t linesBefore) {
+  if (error.line != 0) error.line += linesBefore;
+}
 
 }  // namespace
+
+std::uint64_t tracefileSecondHalf(const std::string& path) {
+  int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+  if (fd < 0) return 0;
+  struct stat st;
+  std::uint64_t split = 0;
+  if (fstat(fd, &st) == 0 && S_ISREG(st.st_mode) && std::uint64_t(st.st_size) >= kTracefileHalves)
+    split = secondHalf(fd, static_cast<std::uint64_t>(st.st_size));
+  close(fd);
+  return split;
+}
 
 bool readPlainTracefile(const std::string& path, ImportedData& data, ImportError& error, bool& handled) {
   handled = false;
   int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
   if (fd < 0) return false;
   struct stat st;
-  if (fstat(fd, &st) != 0 || !S_ISREG(st.st_mode)) {
+  char head[4096];
+  ssize_t got = -1;
+  if (fstat(fd, &st) == 0 && S_ISREG(st.st_mode)) {
+    do got = pread(fd, head, sizeof head, 0);
+    while (got < 0 && errno == EINTR);
+  }
+  // The start says what the input is; gzip data and anything not a tracefile go the way of
+  // readInputText, which reads them whole (and says why one cannot be read).
+  const bool gzip = got >= 2 && static_cast<unsigned char>(head[0]) == 0x1f && static_cast<unsigned char>(head[1]) == 0x8b;
+  if (got <= 0 || gzip || detectFormat(std::string(head, static_cast<std::size_t>(got))) != InputFormat::lcov) {
     close(fd);
     return false;
   }
-  std::string buf(kTracefilePiece, '\0');
-  std::size_t have = 0;  // bytes in buf; the first `have` are not yet fed
-  std::unique_ptr<LcovTracefileReader> reader;
-  int failure = 0;
-  for (;;) {
-    if (have == buf.size()) buf.resize(2 * buf.size());  // a line longer than the buffer
-    ssize_t got = read(fd, buf.data() + have, buf.size() - have);
-    if (got < 0 && errno == EINTR) continue;
-    if (got < 0) failure = errno;
-    if (got <= 0) break;
-    have += static_cast<std::size_t>(got);
-    if (!reader) {
-      // The first piece says what the input is; gzip data and anything not a tracefile go
-      // the way of readInputText, which reads them whole.
-      const bool gzip = have >= 2 && static_cast<unsigned char>(buf[0]) == 0x1f &&
-                        static_cast<unsigned char>(buf[1]) == 0x8b;
-      if (gzip || detectFormat(buf.substr(0, std::min<std::size_t>(have, 4096))) != InputFormat::lcov) {
-        close(fd);
-        return false;
-      }
-      handled = true;
-      error.file = path;
-      error.line = 0;
-      reader = std::make_unique<LcovTracefileReader>(path, data, error, static_cast<std::size_t>(st.st_size));
-    }
-    // Whole lines are read now; the rest waits for the next piece.
-    const void* lastNewline = memrchr(buf.data(), '\n', have);
-    if (!lastNewline) continue;
-    const std::size_t whole = static_cast<std::size_t>(static_cast<const char*>(lastNewline) - buf.data()) + 1;
-    if (!reader->feed(std::string_view(buf.data(), whole))) {
-      close(fd);
-      reader->finish();
-      return false;
-    }
-    std::memmove(buf.data(), buf.data() + whole, have - whole);
-    have -= whole;
+  handled = true;
+  error.file = path;
+  error.line = 0;
+  const std::uint64_t size = static_cast<std::uint64_t>(st.st_size);
+  const std::uint64_t split = size >= kTracefileHalves ? secondHalf(fd, size) : 0;
+  std::uint64_t lines = 0;
+  if (split == 0) {
+    const bool ok = readRange(fd, 0, UINT64_MAX, path, data, error, lines);
+    close(fd);
+    return ok;
   }
+  // Two halves at once, the second into data of its own, added to the first's when both
+  // are read: as one reader of the whole file, which holds no record where the second
+  // half begins, would have read them.
+  ImportedData second;
+  second.baseDirectory = data.baseDirectory;
+  ImportError secondError{path, 0, {}};
+  bool secondOk = false;
+  std::uint64_t secondLines = 0;
+  std::exception_ptr secondFailure;
+  auto readSecond = [&] {
+    try {
+      secondOk = readRange(fd, split, UINT64_MAX, path, second, secondError, secondLines);
+    } catch (...) {
+      secondFailure = std::current_exception();
+    }
+  };
+  std::thread worker;
+  try {
+    worker = std::thread(readSecond);
+  } catch (const std::system_error&) {
+    readSecond();  // no thread to be had: one half after the other
+  }
+  bool firstOk = false;
+  std::exception_ptr firstFailure;
+  try {
+    firstOk = readRange(fd, 0, split, path, data, error, lines);
+  } catch (...) {
+    firstFailure = std::current_exception();
+  }
+  if (worker.joinable()) worker.join();
   close(fd);
-  if (!reader) {
-    // Nothing could be read: readInputText says why, or reads what is there.
+  if (firstFailure) std::rethrow_exception(firstFailure);
+  if (!firstOk) return false;
+  if (secondFailure) std::rethrow_exception(secondFailure);
+  if (!secondOk) {
+    error = secondError;
+    inWholeFile(error, lines);
     return false;
   }
-  if (failure != 0) {
-    reader->finish();
-    error.file = path;
-    error.line = 0;
-    error.message = std::string("cannot read: ") + strerror(failure);
-    return false;
-  }
-  // The last line, which may lack its newline.
-  bool ok = reader->feed(std::string_view(buf.data(), have));
-  return reader->finish() && ok;
+  addImportedData(data, std::move(second));
+  return true;
 }
 
 InputFormat detectFormat(const std::string& text) {

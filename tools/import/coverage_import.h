@@ -408,6 +408,8 @@ struct ImportedData {
 
 // Adds everything `from` holds to `into`, as reading its inputs after `into`'s would have.
 void addImportedData(ImportedData& into, const ImportedData& from);
+// The same, taking over the files `into` does not have yet; `from` is left empty.
+void addImportedData(ImportedData& into, ImportedData&& from);
 
 // Leaves out of the files read from gcov what lcov 1.16 (Debian 12) leaves out by the
 // markers in their sources: lines marked LCOV_EXCL_LINE or between LCOV_EXCL_START and
@@ -461,6 +463,8 @@ class LcovTracefileReader {
   LcovTracefileReader& operator=(const LcovTracefileReader&) = delete;
   bool feed(std::string_view wholeLines);
   bool finish();
+  // Lines read so far (after finish(), all of them).
+  std::uint64_t linesRead() const;
 
  private:
   struct State;
@@ -470,4 +474,7 @@ class LcovTracefileReader {
 // A plain (not compressed) lcov tracefile is parsed as it is read, a few megabytes at a
 // time, so that its text is never held whole. handled false: the input is no such file (or
 // its format cannot be told from its start), and nothing was read into `data`.
+// Large ones are read as two halves on two threads.
 bool readPlainTracefile(const std::string& path, ImportedData& data, ImportError& error, bool& handled);
+// Where readPlainTracefile begins the second half of that file; 0 when it reads it in one.
+std::uint64_t tracefileSecondHalf(const std::string& path);

@@ -373,6 +373,8 @@ bool LcovTracefileReader::feed(std::string_view text) {
   return s_->ok;
 }
 
+std::uint64_t LcovTracefileReader::linesRead() const { return s_->p.lineNo; }
+
 bool LcovTracefileReader::finish() {
   Parser& p = s_->p;
   if (p.current) p.current->settle();
