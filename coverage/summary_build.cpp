@@ -285,11 +285,26 @@ ErrorCode FileCounter::run() {
 
 // Lines past the end of the file's lines are never stored; when asked for, the first one of
 // a file is reported.
-void noticeDamagedLines(MessageSink& messages, const ObjRecord& record) {
-  messages.notice(stringPrintf("The line number information of file %s is corrupted.\n"
-                               "Kestrel will not process this information\n",
-                               record.fileName()));
-}
+class DamagedLines {
+ public:
+  DamagedLines(const SumFile& file, MessageSink& messages) : file_(file), messages_(messages) {}
+  // True for a line past the end, which is then left out.
+  bool pastEnd(std::uint32_t line) {
+    if (line <= file_.lineCount) return false;
+    if (!reported_ && corruptedLinesReported()) {
+      reported_ = true;
+      messages_.notice(stringPrintf("The line number information of file %s is corrupted.\n"
+                                    "Kestrel will not process this information\n",
+                                    file_.record->fileName()));
+    }
+    return true;
+  }
+
+ private:
+  const SumFile& file_;
+  MessageSink& messages_;
+  bool reported_ = false;
+};
 
 void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet* set,
                      MessageSink& messages, LineStates& states, bool withClasses = true) {
@@ -322,7 +337,7 @@ void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet*
   };
   std::uint32_t last = 0;
   std::uint16_t blockCount = 0;
-  bool reported = false;
+  DamagedLines damaged(f, messages);
   for (std::size_t i = 0; i < map.size(); ++i) {
     std::uint32_t tag = mapTag(map[i]);
     std::uint32_t v = mapValue(map[i]);
@@ -332,13 +347,7 @@ void buildLineStates(const SumFile& f, std::uint32_t policy, const CvgAdjustSet*
       last = v;
     } else if (tag == TagBlock || tag == TagBlockLine) {
       if (tag == TagBlock) blockCount = i < counts.size() ? counts[i] : 0;
-      if (v > f.lineCount) {
-        if (!reported && corruptedLinesReported()) {
-          reported = true;
-          noticeDamagedLines(messages, *f.record);
-        }
-        continue;
-      }
+      if (damaged.pastEnd(v)) continue;
       if (LineState* s = states.single(v)) {
         if (s->flags & LineHasCode) {
           s->count = combineHits(policy, s->count, blockCount);
@@ -713,20 +722,14 @@ const std::vector<std::uint32_t>& LazyLineStates::packed(const SumFile& file) {
   packed_.assign(std::size_t(file.lineCount) + 1, 0);
   std::uint32_t* lines = packed_.data();
   std::uint16_t blockCount = 0;
-  bool reported = false;
+  DamagedLines damaged(file, messages_);
   // As buildLineStates does for the lines with code.
   for (std::size_t i = 0; i < map.size(); ++i) {
     const std::uint32_t tag = mapTag(map[i]);
     if (tag != TagBlock && tag != TagBlockLine) continue;
     const std::uint32_t v = mapValue(map[i]);
     if (tag == TagBlock) blockCount = i < counts.size() ? counts[i] : 0;
-    if (v > file.lineCount) {
-      if (!reported && corruptedLinesReported()) {
-        reported = true;
-        noticeDamagedLines(messages_, *file.record);
-      }
-      continue;
-    }
+    if (damaged.pastEnd(v)) continue;
     if (v == 0) continue;
     std::uint32_t& w = lines[v];
     if (w & (LineHasCode << 16)) {
