@@ -163,7 +163,7 @@ class GuardedWriter {
     return std::to_chars(q, q + 10, v).ptr;
   }
   // The lines of blocks and source lines, most of a report, are written straight into the
-  // buffer: room() gives space for a line of at most n bytes, lineSpace() the free space up
+  // buffer: room() gives space for a line of at most n bytes, lineSpace() all the space left
   // (at least kSlack bytes), took() ends what was written at `end`.
   char* room(std::size_t n) {
     if (cap_ - used_ < n) makeRoom(n);
