@@ -11,6 +11,7 @@
 
 #include "coverage/kgv_file.h"
 #include "tests/common/test_support.h"
+#include "tests/coverage/kgv_test_util.h"
 
 using kgtest::runProcess;
 
@@ -756,6 +757,32 @@ TEST(ImportCommand, MessagesSayWhatIsWrongAndWhatToDo) {
   ASSERT_EQ(recs.size(), 1u);
   EXPECT_EQ(recs[0].path, b.real("prog.c"));
 }
+
+#if !defined(__SANITIZE_ADDRESS__)  // a limit on the address space leaves no room for the sanitizer's
+TEST(ImportCommand, RunningOutOfMemoryEndsWithAMessageAndLeavesTheOutputAsItWas) {
+  kgtest::TempDir dir;
+  // About 10 MB of tracefile: it needs several times the memory the limit leaves.
+  std::string text;
+  for (int f = 0; text.size() < (std::size_t(10) << 20); ++f) {
+    text += "TN:\nSF:/src/d" + std::to_string(f % 400) + "/file" + std::to_string(f) + ".c\n";
+    for (int k = 0; k < 4; ++k) text += "FN:" + std::to_string(k * 25 + 1) + ",func_" + std::to_string(f) + "_" + std::to_string(k) + "\n";
+    for (int l = 1; l <= 100; l += 3) text += "DA:" + std::to_string(l) + "," + std::to_string((l * f) % 7) + "\n";
+    text += "end_of_record\n";
+  }
+  const std::string input = dir.file("big.info"), output = dir.file("out.kgv");
+  kgtest::writeFile(input, text);
+  kgtest::writeFile(output, "the previous contents");
+  const std::string importer = kgtest::binPath("kestrel-import");
+  auto r = runProcess({"/bin/sh", "-c", "ulimit -v 40000 && exec '" + importer + "' -o '" + output + "' '" + input + "'"});
+  EXPECT_EQ(r.status, 2) << r.err;
+  EXPECT_EQ(r.err, "kestrel-import: out of memory\n");
+  EXPECT_EQ(kgtest::readFile(output), "the previous contents");
+  EXPECT_EQ(kgtest::filesIn(dir.path()).size(), 2u);  // no lock or new copy left behind
+  // With room, the same input imports.
+  r = runProcess({importer, "-o", output, input});
+  EXPECT_EQ(r.status, 0) << r.err;
+}
+#endif
 
 TEST(ImportCommand, AGzipBombIsRefusedWithinItsCeiling) {
   kgtest::TempDir dir;

@@ -8,6 +8,8 @@
 #include <cstdio>
 #include <cstring>
 #include <ctime>
+#include <exception>
+#include <new>
 #include <string>
 #include <vector>
 
@@ -57,9 +59,7 @@ bool isDirectory(const std::string& path) {
   return stat(path.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
 }
 
-}  // namespace
-
-int main(int argc, char** argv) {
+int runImport(int argc, char** argv) {
   // Stopped part way, the output's lock and its unfinished new copy go with the process.
   kgInstallSignalHandlers();
   std::string out;
@@ -171,7 +171,12 @@ int main(int argc, char** argv) {
   // Other programs may be reading or merging into the same file: write under its lock.
   ErrorCode rc = lockKgvFile(out);
   if (rc == allOK) {
-    rc = writeKgvFile(out, *kgv);
+    try {
+      rc = writeKgvFile(out, *kgv);
+    } catch (...) {
+      unlockKgvFile(out);  // no lock left behind for others to wait on
+      throw;
+    }
     ErrorCode unlocked = unlockKgvFile(out);
     if (rc == allOK) rc = unlocked;
   }
@@ -185,4 +190,18 @@ int main(int argc, char** argv) {
   }
   if (rc != allOK) return fail("cannot write " + out + ":\n" + errorMessage(rc));
   return 0;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  // Data that do not fit in memory (or a limit set on it) end the import with a message,
+  // as any other failure does; the output is replaced only when written whole.
+  try {
+    return runImport(argc, argv);
+  } catch (const std::bad_alloc&) {
+    return fail("out of memory");
+  } catch (const std::exception& e) {
+    return fail(std::string("stopped: ") + e.what());
+  }
 }
