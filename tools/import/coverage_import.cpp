@@ -349,12 +349,6 @@ size_t PathIndex::findOrAdd(std::string_view name, size_t value) {
   return value;
 }
 
-bool PathIndex::emplace(std::string_view name, size_t value) {
-  const size_t before = size_;
-  findOrAdd(name, value);
-  return size_ != before;
-}
-
 ImportedFile& ImportedData::file(std::string path) {
   const size_t at = fileIndex.findOrAdd(path, files.size());
   if (at != files.size()) return files[at];

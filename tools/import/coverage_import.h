@@ -342,8 +342,6 @@ class PathIndex {
   iterator end() const { return iterator(); }
   size_t size() const { return size_; }
   bool empty() const { return size_ == 0; }
-  // Adds the name unless it is there; false if it was.
-  bool emplace(std::string_view name, size_t value);
   // The value of the name, which is added with `value` when it is not there (one look-up).
   size_t findOrAdd(std::string_view name, size_t value);
   void reserve(size_t n);
