@@ -615,11 +615,12 @@ bool feedRange(int fd, std::uint64_t from, std::uint64_t to, LcovTracefileReader
 }
 
 // Bytes from..to of the file as a whole input (ended with finish()): false with the error.
-// linesRead: how many lines were read.
-bool readRange(int fd, std::uint64_t from, std::uint64_t to, const std::string& path, ImportedData& data,
-               ImportError& error, std::uint64_t& linesRead) {
-  const std::uint64_t size = to == UINT64_MAX ? 0 : to - from;
-  LcovTracefileReader reader(path, data, error, static_cast<std::size_t>(size));
+// fileSize (as the file was opened) gives the data room for their files; linesRead: how
+// many lines were read.
+bool readRange(int fd, std::uint64_t from, std::uint64_t to, std::uint64_t fileSize, const std::string& path,
+               ImportedData& data, ImportError& error, std::uint64_t& linesRead) {
+  const std::uint64_t end = std::min(to, fileSize);
+  LcovTracefileReader reader(path, data, error, static_cast<std::size_t>(end > from ? end - from : 0));
   int readErrno = 0;
   const bool fed = feedRange(fd, from, to, reader, readErrno);
   const bool finished = reader.finish();
@@ -693,7 +694,7 @@ bool readPlainTracefile(const std::string& path, ImportedData& data, ImportError
   const std::uint64_t split = size >= kTracefileHalves ? secondHalf(fd, size) : 0;
   std::uint64_t lines = 0;
   if (split == 0) {
-    const bool ok = readRange(fd, 0, UINT64_MAX, path, data, error, lines);
+    const bool ok = readRange(fd, 0, UINT64_MAX, size, path, data, error, lines);
     close(fd);
     return ok;
   }
@@ -708,7 +709,7 @@ bool readPlainTracefile(const std::string& path, ImportedData& data, ImportError
   std::exception_ptr secondFailure;
   auto readSecond = [&] {
     try {
-      secondOk = readRange(fd, split, UINT64_MAX, path, second, secondError, secondLines);
+      secondOk = readRange(fd, split, UINT64_MAX, size, path, second, secondError, secondLines);
     } catch (...) {
       secondFailure = std::current_exception();
     }
@@ -722,7 +723,7 @@ bool readPlainTracefile(const std::string& path, ImportedData& data, ImportError
   bool firstOk = false;
   std::exception_ptr firstFailure;
   try {
-    firstOk = readRange(fd, 0, split, path, data, error, lines);
+    firstOk = readRange(fd, 0, split, size, path, data, error, lines);
   } catch (...) {
     firstFailure = std::current_exception();
   }
